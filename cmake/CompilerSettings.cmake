@@ -1,0 +1,39 @@
+# How every target of the project is compiled. Sanitizers and coverage are chosen by presets, never by hand in a target.
+
+option(PALISADE_BENCHMARKS "Build the benchmarks" OFF)
+option(PALISADE_COVERAGE "Instrument for line and branch coverage" OFF)
+option(PALISADE_WERROR "Treat warnings as errors" ON)
+set(PALISADE_SANITIZERS "" CACHE STRING "Sanitizers to build with, as for -fsanitize=")
+
+set(CMAKE_CXX_STANDARD 20)
+set(CMAKE_CXX_STANDARD_REQUIRED ON)
+set(CMAKE_CXX_EXTENSIONS OFF)
+set(CMAKE_POSITION_INDEPENDENT_CODE ON)
+set(CMAKE_EXPORT_COMPILE_COMMANDS ON)
+
+# A module exports what it marks for export; nothing else leaves it.
+set(CMAKE_CXX_VISIBILITY_PRESET hidden)
+set(CMAKE_VISIBILITY_INLINES_HIDDEN ON)
+
+# Headers are included by their path from the top, and log records name files the same way.
+include_directories(${PROJECT_SOURCE_DIR})
+add_compile_options(
+  -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor -Wold-style-cast -Woverloaded-virtual
+  -fmacro-prefix-map=${PROJECT_SOURCE_DIR}/= -fstack-protector-strong)
+add_link_options(-Wl,--as-needed -Wl,-z,relro -Wl,-z,now)
+
+if(PALISADE_WERROR)
+  add_compile_options(-Werror)
+endif()
+
+if(PALISADE_SANITIZERS)
+  add_compile_options(-fsanitize=${PALISADE_SANITIZERS} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+  add_link_options(-fsanitize=${PALISADE_SANITIZERS})
+endif()
+
+if(PALISADE_COVERAGE)
+  add_compile_options(--coverage -O0 -fno-inline)
+  add_link_options(--coverage)
+endif()
+
+find_package(Threads REQUIRED)
