@@ -1,4 +1,5 @@
-# palisade_add_plugin(NAME SOURCES... ): a loadable plug-in module in a plug-in folder of its own.
+# palisade_add_plugin(NAME SOURCES...): a loadable plug-in module in a plug-in folder of its own.
+# palisade_add_strings(NAME FOLDER): the texts of that plug-in, from FOLDER/LANGUAGE.po, in either order of the two calls.
 #
 # A plug-in folder holds the module and, beside it, Resources/LANGUAGE/LC_MESSAGES/Localizable.mo. The same layout is used in the
 # build tree and after installation, so a module finds its texts wherever it is loaded from.
@@ -16,5 +17,30 @@ function(palisade_add_plugin name)
   target_link_options(${name} PRIVATE -Wl,-z,nodelete -Wl,--exclude-libs,ALL)
   if(NOT PALISADE_SANITIZERS)
     target_link_options(${name} PRIVATE -Wl,-z,defs)
+  endif()
+  if(TARGET ${name}-strings)
+    add_dependencies(${name} ${name}-strings)
+  endif()
+endfunction()
+
+function(palisade_add_strings name folder)
+  find_program(PALISADE_MSGFMT msgfmt REQUIRED)
+  file(GLOB sources CONFIGURE_DEPENDS ${folder}/*.po)
+  foreach(source IN LISTS sources)
+    cmake_path(GET source STEM LAST_ONLY language)
+    set(messages Resources/${language}/LC_MESSAGES)
+    set(catalogue ${PALISADE_PLUGIN_BUILD_DIR}/${name}/${messages}/Localizable.mo)
+    add_custom_command(OUTPUT ${catalogue}
+      COMMAND ${CMAKE_COMMAND} -E make_directory ${PALISADE_PLUGIN_BUILD_DIR}/${name}/${messages}
+      COMMAND ${PALISADE_MSGFMT} --check --output-file=${catalogue} ${source}
+      DEPENDS ${source}
+      COMMENT "Compiling ${name}'s texts in ${language}"
+      VERBATIM)
+    install(FILES ${catalogue} DESTINATION ${PALISADE_PLUGIN_INSTALL_DIR}/${name}/${messages})
+    list(APPEND catalogues ${catalogue})
+  endforeach()
+  add_custom_target(${name}-strings ALL DEPENDS ${catalogues})
+  if(TARGET ${name})
+    add_dependencies(${name} ${name}-strings)
   endif()
 endfunction()
