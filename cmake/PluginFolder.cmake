@@ -1,5 +1,5 @@
-# palisade_add_plugin(NAME SOURCES...): a loadable plug-in module in a plug-in folder of its own.
-# palisade_add_strings(NAME FOLDER): the texts of that plug-in, from FOLDER/LANGUAGE.po, in either order of the two calls.
+# palisade_add_plugin(NAME SOURCES... [EXPORTS SYMBOLS...]): a loadable plug-in module in a plug-in folder of its own. The module
+# shows its entry point, what EXPORTS names, and nothing else, not even what it took from the standard library.
 #
 # A plug-in folder holds the module and, beside it, Resources/LANGUAGE/LC_MESSAGES/Localizable.mo. The same layout is used in the
 # build tree and after installation, so a module finds its texts wherever it is loaded from.
@@ -8,18 +8,20 @@ set(PALISADE_PLUGIN_BUILD_DIR ${PROJECT_BINARY_DIR}/plugins)
 set(PALISADE_PLUGIN_INSTALL_DIR ${CMAKE_INSTALL_LIBDIR}/palisade/plugins)
 
 function(palisade_add_plugin name)
-  add_library(${name} MODULE ${ARGN})
+  cmake_parse_arguments(PLUGIN "" "" "EXPORTS" ${ARGN})
+  add_library(${name} MODULE ${PLUGIN_UNPARSED_ARGUMENTS})
   set_target_properties(${name} PROPERTIES
     PREFIX ""
     LIBRARY_OUTPUT_DIRECTORY ${PALISADE_PLUGIN_BUILD_DIR}/${name})
   target_link_libraries(${name} PRIVATE palisade-platform)
+
+  string(JOIN "; " exports accountAccessPluginModule ${PLUGIN_EXPORTS})
+  file(CONFIGURE OUTPUT ${CMAKE_CURRENT_BINARY_DIR}/${name}.map
+    CONTENT "{ global: ${exports}; local: *; };\n")
   # What the daemon loads stays loaded: registrations and callbacks of a module outlive its objects.
-  target_link_options(${name} PRIVATE -Wl,-z,nodelete -Wl,--exclude-libs,ALL)
+  target_link_options(${name} PRIVATE -Wl,-z,nodelete -Wl,--version-script=${CMAKE_CURRENT_BINARY_DIR}/${name}.map)
   if(NOT PALISADE_SANITIZERS)
     target_link_options(${name} PRIVATE -Wl,-z,defs)
-  endif()
-  if(TARGET ${name}-strings)
-    add_dependencies(${name} ${name}-strings)
   endif()
 endfunction()
 
