@@ -27,7 +27,8 @@ struct AlertDescription {
 /// for an alert that it could not create, show or authenticate the answer of.
 using AlertResponse = std::uintptr_t;
 inline constexpr AlertResponse AlertResponseDefaultButton = 0;
-inline constexpr AlertResponse AlertResponseNobody = UINTPTR_MAX;
+inline constexpr AlertResponse AlertResponseAlternateButton = 1;
+inline constexpr AlertResponse AlertResponseNobody = UINTPTR_MAX;  ///< taken down, closed or never shown: nobody's answer
 
 /// The plain alert level, with no further options.
 inline constexpr unsigned AlertFlagsPlain = 0;

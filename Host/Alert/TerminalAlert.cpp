@@ -1,0 +1,213 @@
+#include "Host/Alert/TerminalAlert.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <sys/eventfd.h>
+#include <sys/ioctl.h>
+#include <termios.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <limits>
+#include <span>
+#include <string_view>
+#include <utility>
+
+#include "Host/Alert/TerminalDialog.h"
+
+namespace palisade {
+namespace {
+
+using Clock = std::chrono::steady_clock;
+
+class FileDescriptor {
+ public:
+  explicit FileDescriptor(int descriptor) : _descriptor(descriptor) {}
+  FileDescriptor(FileDescriptor&& other) noexcept : _descriptor(std::exchange(other._descriptor, -1)) {}
+  FileDescriptor& operator=(FileDescriptor&&) = delete;
+  ~FileDescriptor() {
+    if (_descriptor >= 0) close(_descriptor);
+  }
+  int get() const { return _descriptor; }
+  bool isOpen() const { return _descriptor >= 0; }
+
+ private:
+  int _descriptor;
+};
+
+FileDescriptor openTerminal(const std::string& path) {
+  FileDescriptor terminal(open(path.c_str(), O_RDWR | O_CLOEXEC | O_NOCTTY));
+  if (terminal.isOpen() && isatty(terminal.get()) != 1) return FileDescriptor(-1);
+  return terminal;
+}
+
+std::size_t columnsOfTerminal(int terminal) {
+  winsize size{};
+  return ioctl(terminal, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 ? size.ws_col : 80;
+}
+
+void writeAll(int descriptor, std::string_view text) {
+  while (!text.empty()) {
+    const ssize_t written = write(descriptor, text.data(), text.size());
+    if (written < 0 && errno != EINTR) return;
+    if (written > 0) text.remove_prefix(static_cast<std::size_t>(written));
+  }
+}
+
+enum class Key { none, selectAlternate, selectDefault, selectOther, press, close };
+
+// Takes the first key off `input`, which is not empty: an escape sequence (ECMA-48) or a byte. One read may bring several.
+std::string_view takeKey(std::string_view& input) {
+  std::size_t length = 1;
+  if (input.starts_with("\x1bO")) {
+    length = std::min<std::size_t>(input.size(), 3);
+  } else if (input.starts_with("\x1b[")) {
+    length = 2;
+    while (length < input.size() && (input[length] < '@' || input[length] > '~')) ++length;
+    length = std::min(input.size(), length + 1);
+  }
+  const std::string_view key = input.substr(0, length);
+  input.remove_prefix(length);
+  return key;
+}
+
+// The keys of a two-button dialog. An escape sequence that is not an arrow is no key of ours; a lone Escape closes.
+Key keyOf(std::string_view input) {
+  if (input == "\x1b[D" || input == "\x1bOD") return Key::selectAlternate;
+  if (input == "\x1b[C" || input == "\x1bOC") return Key::selectDefault;
+  if (input == "\t" || input == "\x1b[Z") return Key::selectOther;
+  if (input == "\r" || input == "\n" || input == " ") return Key::press;
+  if (input == "\x1b" || input == "\x03" || input == "\x04") return Key::close;
+  return Key::none;
+}
+
+// For poll(2): -1 waits for ever.
+int millisecondsUntil(Clock::time_point deadline) {
+  if (deadline == Clock::time_point::max()) return -1;
+  const auto remaining = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now()).count();
+  return static_cast<int>(std::clamp<decltype(remaining)>(remaining, 0, std::numeric_limits<int>::max()));
+}
+
+class TerminalAlertHandle final : public AlertHandle {
+ public:
+  TerminalAlertHandle(FileDescriptor terminal, FileDescriptor takenDown, AlertDescription description)
+      : _terminal(std::move(terminal)),
+        _takenDown(std::move(takenDown)),
+        _description(std::move(description)) {
+    tcgetattr(_terminal.get(), &_earlierSettings);
+    termios keys = _earlierSettings;
+    cfmakeraw(&keys);
+    // What was typed before the alert stood there was meant for something else.
+    tcsetattr(_terminal.get(), TCSAFLUSH, &keys);
+    writeAll(_terminal.get(), "\r\n");
+    draw();
+  }
+
+  ~TerminalAlertHandle() override { tcsetattr(_terminal.get(), TCSAFLUSH, &_earlierSettings); }
+
+  void takeDown() const { eventfd_write(_takenDown.get(), 1); }
+
+  AlertResponse waitForAnswer(std::chrono::milliseconds armedAfter, Clock::time_point deadline) {
+    Clock::time_point armedAt = Clock::now() + armedAfter;
+    char buffer[64];
+    while (true) {
+      const std::size_t length = readKeys(buffer, deadline);
+      if (length == 0) return AlertResponseNobody;
+      for (std::string_view input(buffer, length); !input.empty();) {
+        switch (keyOf(takeKey(input))) {
+          case Key::close: return AlertResponseNobody;
+          case Key::selectAlternate: select(DialogButton::alternate); break;
+          case Key::selectDefault: select(DialogButton::defaultButton); break;
+          case Key::selectOther:
+            select(_selected == DialogButton::alternate ? DialogButton::defaultButton : DialogButton::alternate);
+            break;
+          case Key::press:
+            if (_selected == DialogButton::alternate) return AlertResponseAlternateButton;
+            if (Clock::now() >= armedAt) return AlertResponseDefaultButton;
+            armedAt = Clock::now() + armedAfter;
+            break;
+          case Key::none: break;
+        }
+      }
+    }
+  }
+
+ private:
+  void draw() {
+    const std::string dialog = drawDialog(_description, _selected, columnsOfTerminal(_terminal.get()));
+    _drawnLines = static_cast<std::size_t>(std::ranges::count(dialog, '\n'));
+    writeAll(_terminal.get(), dialog);
+  }
+
+  void select(DialogButton button) {
+    _selected = button;
+    writeAll(_terminal.get(), "\x1b[" + std::to_string(_drawnLines) + "A\r\x1b[J");
+    draw();
+  }
+
+  // Waits for keys; 0 when there will be no answer: taken down, out of time, or the terminal is gone.
+  std::size_t readKeys(std::span<char> buffer, Clock::time_point deadline) const {
+    while (true) {
+      pollfd sources[] = {{.fd = _terminal.get(), .events = POLLIN, .revents = 0},
+                          {.fd = _takenDown.get(), .events = POLLIN, .revents = 0}};
+      const int ready = poll(sources, std::size(sources), millisecondsUntil(deadline));
+      if (ready < 0 && errno == EINTR) continue;
+      if (ready <= 0 || sources[1].revents != 0) return 0;
+
+      const ssize_t length = read(_terminal.get(), buffer.data(), buffer.size());
+      if (length < 0 && errno == EINTR) continue;
+      return length > 0 ? static_cast<std::size_t>(length) : 0;
+    }
+  }
+
+  FileDescriptor _terminal;
+  FileDescriptor _takenDown;
+  AlertDescription _description;
+  termios _earlierSettings{};
+  DialogButton _selected = DialogButton::defaultButton;
+  std::size_t _drawnLines = 0;
+};
+
+std::shared_ptr<TerminalAlertHandle> own(const std::shared_ptr<AlertHandle>& handle) {
+  return std::dynamic_pointer_cast<TerminalAlertHandle>(handle);
+}
+
+}  // namespace
+
+TerminalAlert::TerminalAlert(std::string terminal, std::chrono::milliseconds armedAfter)
+    : _terminal(std::move(terminal)),
+      _armedAfter(armedAfter) {}
+
+bool TerminalAlert::isAvailable() const { return openTerminal(_terminal).isOpen(); }
+
+std::shared_ptr<AlertHandle> TerminalAlert::createAlert(AlertAllocator, double, unsigned, int* errorPlace,
+                                                        const AlertDescription& description) {
+  FileDescriptor terminal = openTerminal(_terminal);
+  FileDescriptor takenDown(eventfd(0, EFD_CLOEXEC));
+  if (!terminal.isOpen() || !takenDown.isOpen()) {
+    if (errorPlace != nullptr) *errorPlace = ENOTTY;
+    return nullptr;
+  }
+  return std::make_shared<TerminalAlertHandle>(std::move(terminal), std::move(takenDown), description);
+}
+
+int TerminalAlert::receiveResponse(const std::shared_ptr<AlertHandle>& handle, double timeoutSeconds, AlertResponse& response) {
+  response = AlertResponseNobody;
+  const auto alert = own(handle);
+  if (alert == nullptr) return EINVAL;
+  const auto deadline = timeoutSeconds > 0
+                            ? Clock::now() + std::chrono::ceil<Clock::duration>(std::chrono::duration<double>(timeoutSeconds))
+                            : Clock::time_point::max();
+  response = alert->waitForAnswer(_armedAfter, deadline);
+  return 0;
+}
+
+// The handle restores the terminal when its last owner lets go of it.
+void TerminalAlert::releaseAlert(std::shared_ptr<AlertHandle> handle) { handle.reset(); }
+
+void TerminalAlert::takeDown(const std::shared_ptr<AlertHandle>& handle) {
+  if (const auto alert = own(handle)) alert->takeDown();
+}
+
+}  // namespace palisade

@@ -1,0 +1,23 @@
+#pragma once
+
+/// Text as a terminal shows it: measured in columns, made harmless, and broken into lines.
+///
+/// Threads: all functions are pure. Errors: bytes that are not UTF-8 show as U+FFFD.
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace palisade {
+
+/// How many columns `text` takes; East Asian wide characters take two.
+std::size_t columnsOf(std::string_view text);
+
+/// `text` with every control character, line break and bidirectional override replaced by a blank: what an application calls
+/// itself can neither move the cursor nor rearrange the sentence around it.
+std::string harmless(std::string_view text);
+
+/// `text` in lines of at most `columns` columns, broken at blanks where there are any.
+std::vector<std::string> wrapped(std::string_view text, std::size_t columns);
+
+}  // namespace palisade
