@@ -146,8 +146,8 @@ std::string describe(const PermissionSet& permissions) {
   std::vector<std::string_view> names(permissions.begin(), permissions.end());
   std::ranges::sort(names);
   std::string text = "{";
-  for (const std::string_view name : names) {
-    if (text.size() > 1) text += ", ";
+  for (const std::string_view& name : names) {
+    if (&name != &names.front()) text += ", ";
     text += name;
   }
   return text + '}';
