@@ -167,11 +167,11 @@ def check(sources, resources):
     return problems, len(keys), len(catalogues)
 
 
-def main():
+def main(argv=None):
     parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
     parser.add_argument("--sources", required=True, help="folder of the plug-in's sources")
     parser.add_argument("--resources", required=True, help="folder of the catalogues, en.po among them")
-    arguments = parser.parse_args()
+    arguments = parser.parse_args(argv)
     try:
         problems, key_count, language_count = check(arguments.sources, arguments.resources)
     except (po.CatalogueError, OSError, UnicodeDecodeError) as error:
