@@ -23,6 +23,8 @@ function(palisade_add_plugin name)
   if(NOT PALISADE_SANITIZERS)
     target_link_options(${name} PRIVATE -Wl,-z,defs)
   endif()
+  # The loader refuses a module that others could change, whatever umask the build ran under.
+  add_custom_command(TARGET ${name} POST_BUILD COMMAND chmod go-w $<TARGET_FILE:${name}> $<TARGET_FILE_DIR:${name}> VERBATIM)
 endfunction()
 
 function(palisade_add_strings name folder)
