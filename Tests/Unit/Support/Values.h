@@ -1,0 +1,95 @@
+#pragma once
+
+/// Short ways to write the values of a test, to compare them, and to show them when a test fails.
+
+#include <initializer_list>
+#include <optional>
+#include <ostream>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include <gmock/gmock.h>
+
+#include "Platform/AccountConstants.h"
+#include "Platform/Format.h"
+#include "Testing/FakePlatform.h"
+
+namespace palisade {
+
+inline const std::string photosAppID = "1234567890";
+
+/// Options as a well-behaved client passes them.
+inline Dictionary optionsAskingFor(Array permissions, std::optional<std::string_view> audience = std::nullopt,
+                                   std::string appID = photosAppID) {
+  Dictionary options{{std::string(FacebookAppIdKey), std::move(appID)},
+                     {std::string(FacebookPermissionsKey), std::move(permissions)}};
+  if (audience) options.set(std::string(FacebookAudienceKey), *audience);
+  return options;
+}
+
+/// What a grant keeps of such options.
+inline Dictionary persistentOptions(std::optional<std::string_view> audience = std::nullopt, std::string appID = photosAppID) {
+  Dictionary options{{std::string(FacebookAppIdKey), std::move(appID)}};
+  if (audience) options.set(std::string(FacebookAudienceKey), *audience);
+  return options;
+}
+
+inline PermissionSetRef permissionSet(std::initializer_list<std::string> names) {
+  return std::make_shared<const PermissionSet>(names);
+}
+
+inline Error accountsError(int code, std::optional<std::string> description = std::nullopt) {
+  return {.domain = std::string(AccountsErrorDomain), .code = code, .description = std::move(description)};
+}
+
+// What a completion was called with.
+
+inline auto isGrant() { return ::testing::FieldsAre(true, ::testing::Eq(std::nullopt)); }
+inline auto isRefusalWithoutError() { return ::testing::FieldsAre(false, ::testing::Eq(std::nullopt)); }
+inline auto isRefusalWith(Error error) { return ::testing::FieldsAre(false, ::testing::Optional(std::move(error))); }
+inline auto isUnexpectedFailureAnswer() {
+  return ::testing::FieldsAre(
+      false, ::testing::Optional(::testing::FieldsAre(std::string(AccountsErrorDomain), int{AccountsErrorUnexpectedFailure},
+                                                      ::testing::Optional(::testing::Not(::testing::IsEmpty())))));
+}
+
+/// A log record without its source file and line.
+struct LogLine {
+  int level = 0;
+  std::string operation;
+  std::string format;
+  std::vector<std::string> arguments = {};
+  std::string argumentNames = {};
+
+  friend bool operator==(const LogLine&, const LogLine&) = default;
+};
+
+inline std::vector<LogLine> logLines(const Trace& trace) {
+  std::vector<LogLine> lines;
+  for (const Event& event : trace.named("log")) {
+    LogLine line{.level = static_cast<int>(*event["level"].integer()),
+                 .operation = *event["operationName"].string(),
+                 .format = *event["format"].string(),
+                 .argumentNames = *event["argumentNames"].string()};
+    for (const Value& argument : *event["args"].array()) line.arguments.push_back(*argument.string());
+    lines.push_back(std::move(line));
+  }
+  return lines;
+}
+
+// How values look in the output of a failing test.
+
+inline void PrintTo(const Value& value, std::ostream* stream) { *stream << compactJson(value); }
+inline void PrintTo(const Dictionary& dictionary, std::ostream* stream) { *stream << compactJson(Value(dictionary)); }
+inline void PrintTo(const Error& error, std::ostream* stream) { *stream << describe(error); }
+inline void PrintTo(const CompletionCall& call, std::ostream* stream) {
+  *stream << (call.granted ? "granted" : "refused") << ", " << (call.error ? describe(*call.error) : "no error");
+}
+inline void PrintTo(const LogLine& line, std::ostream* stream) {
+  *stream << '(' << line.level << ") " << line.operation << ": \"" << line.format << "\" [" << line.argumentNames
+          << "] =" << ::testing::PrintToString(line.arguments);
+}
+
+}  // namespace palisade
