@@ -1,0 +1,151 @@
+#pragma once
+
+/// The daemon's accounts, what each client was granted or refused, and the history of its requests, in one SQLite store.
+///
+/// Threads: every operation may be called from any thread. Writes run one at a time, reads beside them; nothing is held while
+/// the client directory or the change listener is called. Ownership: borrows the directory, which outlives it. Accounts and
+/// records are handed out as detached copies.
+/// Errors: a store that cannot be opened or read is a `SqliteError`. A write answers an error in `StoreErrorDomain`, or throws
+/// it where an operation says so; after either nothing has changed. A record that is damaged is never handed out as a grant:
+/// its look-up throws, a listing shows it as a refusal, and the next write replaces it.
+//  Contents: 1 Opening, accounts (SqliteAccountStore.cpp)  2 Authorizations (SqliteAccountStoreAuthorizations.cpp)
+//  3 History (SqliteAccountStoreHistory.cpp); the prepared queries of all three are in SqliteAccountStoreStatements.h.
+
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "Host/Sqlite/Database.h"
+#include "Platform/AccountStore.h"
+#include "Platform/AuthorizationManager.h"
+#include "Platform/Date.h"
+#include "Platform/Error.h"
+#include "Platform/Log.h"
+
+namespace palisade {
+
+class ClientDirectory;
+struct AuthorizationRow;
+
+/// What a change listener is told, after the change has been stored, on the thread that made it. Two changes by two threads may
+/// be told in either order; a listener that wants the content looks it up.
+struct StoreChange {
+  enum class Kind { accounts, authorizations };
+  Kind kind = Kind::accounts;
+  std::string accountTypeIdentifier = {};
+  std::optional<std::string> clientID = std::nullopt;  ///< none: every client, or no client's matter
+};
+
+struct AccountStoreOptions {
+  std::filesystem::path path;
+  DamagedStore onDamage = DamagedStore::refuse;
+  std::function<void(const StoreChange&)> onChange = nullptr;
+};
+
+struct AccountRecord {
+  std::string id;
+  std::string accountTypeIdentifier;
+  std::string username;
+  std::string description;
+};
+
+/// A record with what the platform's records do not say.
+struct StoredAuthorization {
+  std::string clientID;
+  std::string accountTypeIdentifier;
+  std::shared_ptr<ClientAuthorization> record;
+  Date updatedAt;
+  bool isAnsweredByNobody = false;
+  bool isDamaged = false;
+};
+
+struct HistoryEntry {
+  Date at;
+  std::string accountTypeIdentifier;
+  std::optional<std::string> bundleID;
+  bool granted = false;
+  bool userPrompted = false;
+  double elapsedSeconds = 0.0;
+};
+
+struct HistoryFilter {
+  std::size_t limit = 100;
+  std::optional<std::string> bundleID = std::nullopt;  ///< none: every client's
+};
+
+class SqliteAccountStore final : public AccountStore, public AuthorizationManager {
+ public:
+  /// The history keeps this many entries, the newest.
+  static constexpr std::int64_t historyCapacity = 100'000;
+
+  /// \name Opening, accounts
+  ///@{
+  SqliteAccountStore(AccountStoreOptions options, const ClientDirectory& clients);
+  ~SqliteAccountStore() override;
+
+  /// Where the damaged store went that this one replaces, if any.
+  const std::optional<std::filesystem::path>& damagedStore() const;
+
+  std::vector<std::shared_ptr<Account>> accountsWithAccountTypeIdentifier(std::string_view identifier) override;
+  AuthorizationManager& authorizationManager() override { return *this; }
+
+  std::vector<AccountRecord> accounts();
+
+  /// Throws `SqliteError`: with `StoreErrorConstraint` when the user name already has an account of the type.
+  AccountRecord addAccount(std::string_view accountTypeIdentifier, std::string_view username, std::string_view description);
+
+  /// False when there is no such account. What was granted for it, and its credentials, are the caller's care. Throws.
+  bool removeAccount(std::string_view id);
+  ///@}
+
+  /// \name Authorizations
+  ///@{
+  std::shared_ptr<ClientAuthorization> authorizationForClient(const std::shared_ptr<const Client>& client,
+                                                              const AccountType& accountType) override;
+  std::vector<std::shared_ptr<ClientAuthorization>> allAuthorizationsForAccountType(const AccountType& accountType) override;
+  std::optional<Error> setAuthorization(const ClientAuthorization& authorization,
+                                        const std::shared_ptr<const Client>& forClient,
+                                        const AccountType& onAccountType) override;
+  std::optional<Error> removeAllClientAuthorizationsForAccountType(const AccountType& accountType) override;
+
+  /// Every client's record for the account type, in the store's order.
+  std::vector<StoredAuthorization> storedAuthorizations(std::string_view accountTypeIdentifier);
+
+  /// Stores a refusal that no user gave. It counts like any other until it is removed; a grant is not accepted.
+  std::optional<Error> setAuthorizationAnsweredByNobody(const ClientAuthorization& refusal,
+                                                        const std::shared_ptr<const Client>& forClient,
+                                                        const AccountType& onAccountType);
+
+  /// Removes the client's refusals that no user gave, or everybody's. Other records stay as they are.
+  std::optional<Error> removeAnswersByNobodyForClient(const Client& client);
+  std::optional<Error> removeAllAnswersByNobody();
+  ///@}
+
+  /// \name History
+  ///@{
+  std::optional<Error> appendToHistory(const AccessRequestRecord& record, Date at);
+
+  /// Newest first: in the order of appending, whatever the clock said.
+  std::vector<HistoryEntry> history(const HistoryFilter& filter);
+  ///@}
+
+ private:
+  struct Store;
+
+  template <typename Work>
+  std::optional<Error> _change(const StoreChange& change, Work work);
+  std::optional<Error> _store(const ClientAuthorization& authorization, const std::shared_ptr<const Client>& client,
+                              const AccountType& accountType, bool answeredByNobody);
+  std::shared_ptr<const Client> _clientOf(const AuthorizationRow& row) const;
+  void _tell(const StoreChange& change) const;
+
+  const ClientDirectory& _clients;
+  const std::function<void(const StoreChange&)> _onChange;
+  const std::unique_ptr<Store> _connections;
+};
+
+}  // namespace palisade

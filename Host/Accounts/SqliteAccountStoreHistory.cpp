@@ -1,0 +1,49 @@
+#include "Host/Accounts/SqliteAccountStore.h"
+
+// The history of the clients' requests. It grows by one entry a request and loses its oldest entries, one for each that comes
+// in, once it is full.
+
+#include "Host/Accounts/SqliteAccountStoreStatements.h"
+#include "Host/Sqlite/Transaction.h"
+
+namespace palisade {
+
+std::optional<Error> SqliteAccountStore::appendToHistory(const AccessRequestRecord& record, Date at) {
+  try {
+    _connections->write([&](Database& database, const AccountStoreWriter& writer) {
+      Transaction transaction(database);
+      {
+        Statement::Run row =
+            writer.appendToHistory.run(at.time_since_epoch().count(), record.accountTypeIdentifier, record.bundleID,
+                                       record.granted, record.userPrompted, record.elapsedSeconds);
+        row.next();
+        const std::int64_t position = row.integer(0);
+        row.next();
+        writer.trimHistory.execute(position - historyCapacity);
+      }
+      transaction.commit();
+    });
+  } catch (const SqliteError& error) {
+    return error.error();
+  }
+  return std::nullopt;
+}
+
+std::vector<HistoryEntry> SqliteAccountStore::history(const HistoryFilter& filter) {
+  return _connections->read([&](const AccountStoreReader& reader) {
+    Statement::Run row =
+        filter.bundleID ? reader.historyOfClient.run(filter.limit, *filter.bundleID) : reader.history.run(filter.limit);
+    std::vector<HistoryEntry> entries;
+    while (row.next()) {
+      entries.push_back({.at = Date(std::chrono::seconds(row.integer(0))),
+                         .accountTypeIdentifier = row.text(1),
+                         .bundleID = row.optionalText(2),
+                         .granted = row.boolean(3),
+                         .userPrompted = row.boolean(4),
+                         .elapsedSeconds = row.real(5)});
+    }
+    return entries;
+  });
+}
+
+}  // namespace palisade

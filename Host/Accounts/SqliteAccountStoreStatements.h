@@ -1,0 +1,88 @@
+#pragma once
+
+/// The account store's queries, each prepared once for its connection. Only the files of `SqliteAccountStore` include this.
+
+#include "Host/Accounts/SqliteAccountStore.h"
+#include "Host/Sqlite/Connections.h"
+#include "Host/Sqlite/Statement.h"
+
+namespace palisade {
+
+struct AccountStoreWriter {
+  explicit AccountStoreWriter(Database& database)
+      : addAccount(database, "add an account",
+                   "INSERT INTO accounts (account_type, username, description) VALUES (?1, ?2, ?3) RETURNING id"),
+        removeAccount(database, "remove an account", "DELETE FROM accounts WHERE id = ?1 RETURNING account_type"),
+        setAuthorization(
+            database, "store an authorization",
+            "INSERT INTO authorizations (account_type, client_id, bundle_id, app_name, granted, answered_by_nobody,"
+            " options, permissions, updated_at, digest) VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10)"
+            " ON CONFLICT (account_type, client_id) DO UPDATE SET bundle_id = excluded.bundle_id,"
+            " app_name = excluded.app_name, granted = excluded.granted,"
+            " answered_by_nobody = excluded.answered_by_nobody, options = excluded.options,"
+            " permissions = excluded.permissions, updated_at = excluded.updated_at, digest = excluded.digest"),
+        removeAuthorizations(database, "remove the authorizations", "DELETE FROM authorizations WHERE account_type = ?1"),
+        removeAnswersByNobodyForClient(database, "remove a refusal that nobody gave",
+                                       "DELETE FROM authorizations WHERE answered_by_nobody = 1 AND client_id = ?1"),
+        removeAllAnswersByNobody(database, "remove the refusals that nobody gave",
+                                 "DELETE FROM authorizations WHERE answered_by_nobody = 1"),
+        appendToHistory(database, "write the history",
+                        "INSERT INTO history (at, account_type, bundle_id, granted, user_prompted, elapsed_seconds)"
+                        " VALUES (?1, ?2, ?3, ?4, ?5, ?6) RETURNING position"),
+        trimHistory(database, "shorten the history", "DELETE FROM history WHERE position <= ?1") {}
+
+  Statement addAccount;
+  Statement removeAccount;
+  Statement setAuthorization;
+  Statement removeAuthorizations;
+  Statement removeAnswersByNobodyForClient;
+  Statement removeAllAnswersByNobody;
+  Statement appendToHistory;
+  Statement trimHistory;
+};
+
+struct AccountStoreReader {
+  explicit AccountStoreReader(Database& database)
+      : accounts(database, "list the accounts",
+                 "SELECT id, account_type, username, description FROM accounts ORDER BY position"),
+        accountsOfType(database, "list the accounts",
+                       "SELECT id, username, description FROM accounts WHERE account_type = ?1 ORDER BY position"),
+        authorization(database, "read an authorization",
+                      "SELECT client_id, bundle_id, app_name, granted, answered_by_nobody, options, permissions, updated_at,"
+                      " digest FROM authorizations WHERE account_type = ?1 AND client_id = ?2"),
+        // Nearly all records are of one account type: reading the table in its own order beats the index and a sort.
+        authorizations(database, "list the authorizations",
+                       "SELECT client_id, bundle_id, app_name, granted, answered_by_nobody, options, permissions, updated_at,"
+                       " digest FROM authorizations NOT INDEXED WHERE account_type = ?1 ORDER BY position"),
+        history(database, "read the history",
+                "SELECT at, account_type, bundle_id, granted, user_prompted, elapsed_seconds FROM history"
+                " ORDER BY position DESC LIMIT ?1"),
+        historyOfClient(database, "read the history",
+                        "SELECT at, account_type, bundle_id, granted, user_prompted, elapsed_seconds FROM history"
+                        " WHERE bundle_id = ?2 ORDER BY position DESC LIMIT ?1") {}
+
+  Statement accounts;
+  Statement accountsOfType;
+  Statement authorization;
+  Statement authorizations;
+  Statement history;
+  Statement historyOfClient;
+};
+
+struct SqliteAccountStore::Store : Connections<AccountStoreWriter, AccountStoreReader> {
+  using Connections::Connections;
+};
+
+/// Runs `work(database, writer)` and tells the listener when it has been stored; answers what kept it from being stored.
+template <typename Work>
+std::optional<Error> SqliteAccountStore::_change(const StoreChange& change, Work work) {
+  try {
+    _connections->write(work);
+  } catch (const SqliteError& error) {
+    return error.error();
+  }
+  _tell(change);
+  return std::nullopt;
+}
+
+}  // namespace palisade
