@@ -10,6 +10,7 @@
 #include <stdexcept>
 #include <string>
 #include <string_view>
+#include <thread>
 
 #include <fcntl.h>
 #include <linux/futex.h>
@@ -100,7 +101,11 @@ std::optional<RestingStates> restingStates(const std::set<pid_t>& unwatched) {
 
 }  // namespace
 
-ThreadsAtRest::ThreadsAtRest() : _unwatched(runningThreads()) {}
+ThreadsAtRest::ThreadsAtRest() {
+  // A sanitizer's runtime starts a thread of its own, which never rests, together with the first thread of the program.
+  std::thread([] {}).join();
+  _unwatched = runningThreads();
+}
 
 bool ThreadsAtRest::now() const {
   // Two looks alike: between the end of the first and the start of the second, all threads slept at once.

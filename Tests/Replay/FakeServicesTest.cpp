@@ -29,8 +29,6 @@ const Error refusal{.domain = "org.example", .code = 5};
 
 class TheScriptedPlatform : public ::testing::Test {
  protected:
-  std::shared_ptr<const FakeClient> client = platform.makeClient({.id = "photos", .description = "Photos"});
-
   ClientAuthorization grantOf(PermissionSet permissions) const {
     ClientAuthorization record(client);
     record.setIsGranted(true);
@@ -44,6 +42,7 @@ class TheScriptedPlatform : public ::testing::Test {
   }
 
   FakePlatform& platform = FakePlatform::create(std::make_shared<NlohmannJsonParser>());
+  const std::shared_ptr<const FakeClient> client = platform.makeClient({.id = "photos", .description = "Photos"});
 };
 
 TEST_F(TheScriptedPlatform, HandsOutRecordsThatChangeNothingInTheStore) {
