@@ -9,9 +9,9 @@ namespace palisade {
 namespace {
 
 using ::testing::ElementsAre;
-using ::testing::Eq;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
+using ::testing::Not;
 using ::testing::Optional;
 
 class TheReadPhrase : public ::testing::Test, protected ConsentScene {

@@ -8,7 +8,6 @@
 namespace palisade {
 namespace {
 
-using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 using ::testing::Optional;
 
