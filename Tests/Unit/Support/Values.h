@@ -79,6 +79,45 @@ inline std::vector<LogLine> logLines(const Trace& trace) {
   return lines;
 }
 
+/// What the plug-in asked of its platform, in order: the events' names, log records as their format in quotes. The set-up that
+/// is made once a process is left out, because it happens in whichever test comes first.
+inline std::vector<std::string> stepsOf(const Trace& trace) {
+  std::vector<std::string> steps;
+  for (const Event& event : trace.events()) {
+    if (event.name == "Queue.create" || event.name == "NotificationBus.register") continue;
+    steps.push_back(event.name == "log" ? '"' + *event["format"].string() + '"' : event.name);
+  }
+  return steps;
+}
+
+/// The permissions of every consent message that was made, as the log names them: "{email, user_likes}".
+inline std::vector<std::string> consentAskedFor(const Trace& trace) {
+  std::vector<std::string> asked;
+  for (const LogLine& line : logLines(trace)) {
+    if (line.format == "Generating user message for permission: %@.") asked.push_back(line.arguments.at(0));
+  }
+  return asked;
+}
+
+/// A trace's form of a set.
+inline Value tracedSet(Array sortedNames) { return Dictionary{{"$set", std::move(sortedNames)}}; }
+
+// What the server answers.
+
+inline ServerAnswer serverGrants(Array permissions, Delivery delivery = Delivery::onThread) {
+  return {.data = compactJson(Dictionary{{"access_token", "client token"}, {"permissions", std::move(permissions)}}),
+          .delivery = delivery};
+}
+
+inline const Error networkDown{.domain = "org.example.network", .code = 7, .description = "No route to host"};
+inline ServerAnswer serverCannotBeReached() { return {.error = networkDown}; }
+
+/// The name of a row of a table test.
+template <typename Case>
+std::string nameOfCase(const ::testing::TestParamInfo<Case>& row) {
+  return row.param.name;
+}
+
 // How values look in the output of a failing test.
 
 inline void PrintTo(const Value& value, std::ostream* stream) { *stream << compactJson(value); }
