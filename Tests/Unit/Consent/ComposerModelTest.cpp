@@ -128,7 +128,7 @@ TEST(AnyRequest, GetsTheMessageOfThePlainModel) {
   ConsentScene scene;
   RandomRequests requests(20250102);
   std::set<std::string> sentences;
-  for (int round = 0; round < 3000; ++round) {
+  for (int round = 0; round < 1500; ++round) {
     const Request request = requests.next();
     // An answer in line: thousands of threads would say no more.
     scene.platform.social.descriptionAnswers = {
