@@ -1,0 +1,108 @@
+#pragma once
+
+/// What stands behind the daemon's D-Bus interface, in the daemon's own terms. The interface itself is described in
+/// DBus/com.veltran.Accounts1.xml.
+///
+/// Threads: each operation runs on a thread of the bus loop and may take as long as a user does; several run at once. Whoever
+/// is about to wait calls `BusLoop::handOver` first. `close` and `callerLeft` come from the thread that reads the bus and never
+/// wait. Ownership: arguments are values. Errors: a `BusFailure` is thrown and becomes the call's error reply; any other
+/// exception becomes the error "Failed".
+
+#include <sys/types.h>
+
+#include <cstdint>
+#include <functional>
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include "Platform/Error.h"
+#include "Platform/Value.h"
+
+namespace palisade {
+
+/// The errors of the interface; each is the last element of com.veltran.Accounts1.Error.NAME.
+enum class BusFailureKind {
+  invalidArguments,
+  notPermitted,
+  unknownCaller,
+  noSuchAccount,
+  noSuchClient,
+  notGranted,
+  tooManyRequests,
+  keychainUnavailable,
+  storeUnavailable,
+  failed
+};
+
+class BusFailure : public std::runtime_error {
+ public:
+  /// `message` is a sentence for people that says what is wrong and, where there is something, what to do.
+  BusFailure(BusFailureKind kind, const std::string& message) : std::runtime_error(message), _kind(kind) {}
+
+  BusFailureKind kind() const { return _kind; }
+
+ private:
+  BusFailureKind _kind;
+};
+
+/// A connection to the bus, as the bus itself describes it.
+struct BusCaller {
+  std::string uniqueName;
+  pid_t processID = 0;
+  uid_t userID = 0;
+  /// Asks the bus once more for the process behind the connection; throws when the connection is gone.
+  std::function<pid_t()> askProcessAgain;
+};
+
+enum class AccessResponse : std::uint32_t { granted = 0, refused = 1, withdrawn = 2, pending = 3 };
+
+struct AccessOutcome {
+  AccessResponse response = AccessResponse::refused;
+  std::optional<Error> error = std::nullopt;
+};
+
+/// A request for access under way. `becomePending` answers the call with the path of a Request object, so that the caller need
+/// not wait for its reply; the outcome then comes as the object's signal. Only the first call does something.
+class PendingRequest {
+ public:
+  virtual ~PendingRequest() = default;
+  virtual void becomePending() = 0;
+  /// Tells requests apart in `AccountsService::close`.
+  virtual std::uint64_t identifier() const = 0;
+};
+
+using Rows = std::vector<Dictionary>;
+
+class AccountsService {
+ public:
+  virtual ~AccountsService() = default;
+
+  virtual AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType, const Dictionary& accessOptions,
+                                      PendingRequest& request) = 0;
+  virtual AccessOutcome authorize(const BusCaller& caller, const std::string& accountType, const std::string& client,
+                                  PendingRequest& request) = 0;
+  virtual std::string credential(const BusCaller& caller, const std::string& accountType) = 0;
+
+  virtual Rows listAccounts(const BusCaller& caller, const std::string& accountType) = 0;
+  virtual std::string addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
+                                 std::string token) = 0;
+  virtual void removeAccount(const BusCaller& caller, const std::string& id) = 0;
+
+  virtual Rows listGrants(const BusCaller& caller, const std::string& accountType) = 0;
+  virtual void revoke(const BusCaller& caller, const std::string& accountType, const std::string& client) = 0;
+  virtual void revokeAll(const BusCaller& caller, const std::string& accountType) = 0;
+
+  virtual Rows history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) = 0;
+  virtual Rows listRevocations(const BusCaller& caller) = 0;
+  virtual Rows listClients(const BusCaller& caller) = 0;
+  virtual Dictionary status(const BusCaller& caller) = 0;
+
+  /// The caller withdraws a pending request of its own.
+  virtual void close(std::uint64_t requestIdentifier) = 0;
+  /// A connection went away; whatever it asked for and is not answered is withdrawn.
+  virtual void callerLeft(const std::string& uniqueName) = 0;
+};
+
+}  // namespace palisade

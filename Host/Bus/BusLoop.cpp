@@ -1,0 +1,131 @@
+#include "Host/Bus/BusLoop.h"
+
+#include <poll.h>
+#include <sdbus-c++/IConnection.h>
+#include <sys/eventfd.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <exception>
+#include <iterator>
+#include <system_error>
+#include <utility>
+
+namespace palisade {
+namespace {
+
+// The loop that this thread leads, or null.
+thread_local BusLoop* ledLoop = nullptr;
+thread_local std::vector<std::function<void()>> deferredWork;
+
+}  // namespace
+
+BusLoop::BusLoop(sdbus::IConnection& connection) : _connection(connection), _wakeUp(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
+  if (_wakeUp < 0) throw std::system_error(errno, std::generic_category(), "No event descriptor for the bus loop");
+}
+
+BusLoop::~BusLoop() { ::close(_wakeUp); }
+
+void BusLoop::run() {
+  serve();
+  std::vector<std::thread> followers;
+  {
+    const std::lock_guard lock(_mutex);
+    followers.swap(_followers);
+  }
+  for (std::thread& follower : followers) follower.join();
+  if (_failure != nullptr) std::rethrow_exception(_failure);
+}
+
+void BusLoop::stop() {
+  {
+    const std::lock_guard lock(_mutex);
+    _isStopping = true;
+  }
+  _leadIsFree.notify_all();
+  wake();
+}
+
+void BusLoop::wake() { eventfd_write(_wakeUp, 1); }
+
+void BusLoop::defer(std::function<void()> work) { deferredWork.push_back(std::move(work)); }
+
+void BusLoop::handOver() {
+  if (ledLoop != nullptr) ledLoop->giveUpLead();
+}
+
+void BusLoop::giveUpLead() {
+  ledLoop = nullptr;
+  const std::lock_guard lock(_mutex);
+  _hasLeader = false;
+  if (_isStopping) return;
+  if (_parked > 0) {
+    _leadIsFree.notify_one();
+  } else {
+    _followers.emplace_back([this] { serve(); });
+  }
+}
+
+void BusLoop::serve() {
+  std::unique_lock lock(_mutex);
+  while (!_isStopping) {
+    if (_hasLeader) {
+      ++_parked;
+      _leadIsFree.wait(lock, [&] { return !_hasLeader || _isStopping; });
+      --_parked;
+      continue;
+    }
+    _hasLeader = true;
+    lock.unlock();
+    lead();
+    lock.lock();
+  }
+}
+
+// Returns when this thread is no longer the leader: its work handed the lead over, or the loop stops.
+void BusLoop::lead() {
+  ledLoop = this;
+  try {
+    while (ledLoop == this) readOnce();
+  } catch (...) {
+    {
+      const std::lock_guard lock(_mutex);
+      if (_failure == nullptr) _failure = std::current_exception();
+    }
+    stop();
+    ledLoop = nullptr;
+  }
+}
+
+void BusLoop::readOnce() {
+  const bool mayHoldMore = _connection.processPendingRequest();
+  const bool hadWork = !deferredWork.empty();
+  for (const auto& work : std::exchange(deferredWork, {})) work();
+  if (ledLoop != this) {
+    // What this thread answered may wait to be sent; only the leader watches for that.
+    wake();
+    return;
+  }
+  if (!mayHoldMore && !hadWork) waitForMessages();
+}
+
+void BusLoop::waitForMessages() {
+  {
+    const std::lock_guard lock(_mutex);
+    if (_isStopping) {
+      ledLoop = nullptr;
+      return;
+    }
+  }
+  const auto bus = _connection.getEventLoopPollData();
+  pollfd sources[] = {{.fd = bus.fd, .events = bus.events, .revents = 0}, {.fd = _wakeUp, .events = POLLIN, .revents = 0}};
+  if (poll(sources, std::size(sources), bus.getPollTimeout()) < 0 && errno != EINTR) {
+    throw std::system_error(errno, std::generic_category(), "Waiting for the bus failed");
+  }
+  if (sources[1].revents != 0) {
+    eventfd_t count = 0;
+    eventfd_read(_wakeUp, &count);
+  }
+}
+
+}  // namespace palisade

@@ -1,0 +1,65 @@
+#pragma once
+
+/// Reads the bus, and carries out on the same thread what a message asks for: leader and followers.
+///
+/// One thread, the leader, waits for messages. A message's work runs on the leader itself, so an answer that needs nobody
+/// changes no thread. Work that is about to wait (for a user, a server, a disk) calls `handOver`: another thread becomes the
+/// leader and goes on reading, and the first one comes back as a follower when its work is done. A work that waits for a day
+/// delays nobody. Threads: `run` is called once and returns after `stop`; `defer` is called from message handlers; `handOver`,
+/// `wake` and `stop` from anywhere. Ownership: borrows the connection. Errors: a lost connection ends `run` with an exception.
+
+#include <condition_variable>
+#include <cstddef>
+#include <functional>
+#include <mutex>
+#include <thread>
+#include <vector>
+
+namespace sdbus {
+class IConnection;
+}
+
+namespace palisade {
+
+class BusLoop {
+ public:
+  explicit BusLoop(sdbus::IConnection& connection);
+  ~BusLoop();
+
+  BusLoop(const BusLoop&) = delete;
+  BusLoop& operator=(const BusLoop&) = delete;
+
+  /// Reads and works until `stop`; then waits for the work under way.
+  void run();
+
+  void stop();
+
+  /// Has `work` run by this thread when the message handler has returned.
+  static void defer(std::function<void()> work);
+
+  /// Lets another thread read the bus. On any thread but the leader it does nothing.
+  static void handOver();
+
+  /// Has the leader look at the connection again: there may be something to send.
+  void wake();
+
+ private:
+  void serve();
+  void lead();
+  void readOnce();
+  void waitForMessages();
+  void giveUpLead();
+
+  sdbus::IConnection& _connection;
+  int _wakeUp;
+
+  std::mutex _mutex;
+  std::condition_variable _leadIsFree;
+  std::vector<std::thread> _followers;
+  std::size_t _parked = 0;
+  bool _hasLeader = false;
+  bool _isStopping = false;
+  std::exception_ptr _failure;
+};
+
+}  // namespace palisade

@@ -1,0 +1,307 @@
+#include "Host/Bus/BusServer.h"
+
+#include <fcntl.h>
+#include <sdbus-c++/sdbus-c++.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <map>
+#include <mutex>
+
+#include "DBus/Accounts1Adaptor.h"
+#include "Host/Bus/BusLoop.h"
+#include "Host/Bus/RequestObjects.h"
+
+namespace palisade {
+namespace {
+
+constexpr const char* busName = "com.veltran.Accounts1";
+constexpr const char* objectPath = "/com/veltran/Accounts1";
+constexpr std::size_t longestToken = 64 * 1024;
+
+using BusRows = std::vector<BusDictionary>;
+
+BusRows rowsToBus(const Rows& rows) {
+  BusRows converted;
+  converted.reserve(rows.size());
+  for (const Dictionary& row : rows) converted.push_back(dictionaryToBus(row));
+  return converted;
+}
+
+void refuseUnknownOptions(const BusDictionary& options, std::initializer_list<std::string_view> known) {
+  for (const auto& [key, value] : options) {
+    if (std::find(known.begin(), known.end(), key) == known.end()) {
+      throw BusFailure(BusFailureKind::invalidArguments, "There is no option '" + key + "'.");
+    }
+  }
+}
+
+template <typename Type>
+std::optional<Type> optionOf(const BusDictionary& options, const std::string& key) {
+  const auto option = options.find(key);
+  if (option == options.end()) return std::nullopt;
+  if (!option->second.containsValueOfType<Type>()) {
+    throw BusFailure(BusFailureKind::invalidArguments, "The option '" + key + "' has the type '" +
+                                                           option->second.peekValueType() + "' instead of '" +
+                                                           sdbus::signature_of<Type>::str() + "'.");
+  }
+  return option->second.get<Type>();
+}
+
+std::string readToEnd(const sdbus::UnixFd& descriptor) {
+  std::string content;
+  char buffer[4096];
+  while (true) {
+    const ssize_t length = read(descriptor.get(), buffer, sizeof buffer);
+    if (length < 0 && errno == EINTR) continue;
+    if (length < 0) throw BusFailure(BusFailureKind::invalidArguments, "The token could not be read from its descriptor.");
+    if (length == 0) return content;
+    content.append(buffer, static_cast<std::size_t>(length));
+    if (content.size() > longestToken) throw BusFailure(BusFailureKind::invalidArguments, "The token is longer than 64 KiB.");
+  }
+}
+
+// A pipe that holds `content` to its end. A token always fits into a pipe's buffer.
+sdbus::UnixFd pipeHolding(const std::string& content) {
+  int ends[2];
+  if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0)
+    throw BusFailure(BusFailureKind::failed, "No pipe could be made for the token.");
+  const sdbus::UnixFd reader(ends[0], sdbus::adopt_fd);
+  const sdbus::UnixFd writer(ends[1], sdbus::adopt_fd);
+  if (write(writer.get(), content.data(), content.size()) != static_cast<ssize_t>(content.size())) {
+    throw BusFailure(BusFailureKind::failed, "The token does not fit into a pipe.");
+  }
+  return reader;
+}
+
+// Carries out `work` and sends what it returns, or the failure that it throws.
+template <typename Result, typename Work>
+void answer(const Result& result, const Work& work) {
+  try {
+    if constexpr (std::is_void_v<decltype(work())>) {
+      work();
+      result.returnResults();
+    } else {
+      result.returnResults(work());
+    }
+  } catch (const BusFailure& failure) {
+    result.returnError(busError(failure));
+  } catch (const sdbus::Error&) {
+    throw;
+  } catch (const std::exception& failure) {
+    result.returnError(busError({BusFailureKind::failed, failure.what()}));
+  }
+}
+
+}  // namespace
+
+class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::veltran::Accounts1::Manager_adaptor> {
+ public:
+  Implementation(std::unique_ptr<sdbus::IConnection> connection, AccountsService& service)
+      : AdaptorInterfaces(*connection, objectPath),
+        _connection(std::move(connection)),
+        _service(service),
+        _loop(*_connection),
+        _requests(*_connection, [this](std::uint64_t identifier) { _service.close(identifier); }) {
+    _connection->addMatch(
+        "type='signal',sender='org.freedesktop.DBus',interface='org.freedesktop.DBus',member='NameOwnerChanged',arg2=''",
+        [this](sdbus::Message& message) { nameVanished(message); }, sdbus::floating_slot);
+    registerAdaptor();
+    _connection->requestName(busName);
+  }
+
+  ~Implementation() { unregisterAdaptor(); }
+
+  BusLoop& loop() { return _loop; }
+
+ private:
+  void RequestAccess(AccessResult&& result, std::string accountType, BusDictionary accessOptions,
+                     BusDictionary options) override {
+    startRequest(std::move(result), options,
+                 [this, accountType, accessOptions](const BusCaller& caller, PendingRequest& request) {
+                   return _service.requestAccess(caller, accountType, dictionaryFromBus(accessOptions), request);
+                 });
+  }
+
+  void Authorize(AccessResult&& result, std::string accountType, std::string client, BusDictionary options) override {
+    startRequest(std::move(result), options, [this, accountType, client](const BusCaller& caller, PendingRequest& request) {
+      return _service.authorize(caller, accountType, client, request);
+    });
+  }
+
+  void GetCredential(sdbus::Result<std::string>&& result, std::string accountType, BusDictionary options) override {
+    start(std::move(result), options, {},
+          [this, accountType](const BusCaller& caller) { return _service.credential(caller, accountType); });
+  }
+
+  void GetCredentialDescriptor(sdbus::Result<sdbus::UnixFd>&& result, std::string accountType, BusDictionary options) override {
+    start(std::move(result), options, {},
+          [this, accountType](const BusCaller& caller) { return pipeHolding(_service.credential(caller, accountType)); });
+  }
+
+  void ListAccounts(sdbus::Result<BusRows>&& result, std::string accountType, BusDictionary options) override {
+    start(std::move(result), options, {},
+          [this, accountType](const BusCaller& caller) { return rowsToBus(_service.listAccounts(caller, accountType)); });
+  }
+
+  void AddAccount(sdbus::Result<std::string>&& result, std::string accountType, std::string username, sdbus::UnixFd token,
+                  BusDictionary options) override {
+    start(std::move(result), options, {}, [this, accountType, username, token](const BusCaller& caller) {
+      BusLoop::handOver();
+      return _service.addAccount(caller, accountType, username, readToEnd(token));
+    });
+  }
+
+  void RemoveAccount(sdbus::Result<>&& result, std::string id, BusDictionary options) override {
+    start(std::move(result), options, {}, [this, id](const BusCaller& caller) { _service.removeAccount(caller, id); });
+  }
+
+  void ListGrants(sdbus::Result<BusRows>&& result, std::string accountType, BusDictionary options) override {
+    start(std::move(result), options, {},
+          [this, accountType](const BusCaller& caller) { return rowsToBus(_service.listGrants(caller, accountType)); });
+  }
+
+  void Revoke(sdbus::Result<>&& result, std::string accountType, std::string client, BusDictionary options) override {
+    start(std::move(result), options, {},
+          [this, accountType, client](const BusCaller& caller) { _service.revoke(caller, accountType, client); });
+  }
+
+  void RevokeAll(sdbus::Result<>&& result, std::string accountType, BusDictionary options) override {
+    start(std::move(result), options, {},
+          [this, accountType](const BusCaller& caller) { _service.revokeAll(caller, accountType); });
+  }
+
+  void History(sdbus::Result<BusRows>&& result, BusDictionary options) override {
+    start(std::move(result), options, {"limit", "client"}, [this, options](const BusCaller& caller) {
+      return rowsToBus(_service.history(caller, optionOf<std::uint32_t>(options, "limit").value_or(100),
+                                        optionOf<std::string>(options, "client")));
+    });
+  }
+
+  void ListRevocations(sdbus::Result<BusRows>&& result, BusDictionary options) override {
+    start(std::move(result), options, {},
+          [this](const BusCaller& caller) { return rowsToBus(_service.listRevocations(caller)); });
+  }
+
+  void ListClients(sdbus::Result<BusRows>&& result, BusDictionary options) override {
+    start(std::move(result), options, {}, [this](const BusCaller& caller) { return rowsToBus(_service.listClients(caller)); });
+  }
+
+  void GetStatus(sdbus::Result<BusDictionary>&& result, BusDictionary options) override {
+    start(std::move(result), options, {}, [this](const BusCaller& caller) { return dictionaryToBus(_service.status(caller)); });
+  }
+
+  std::uint32_t version() override { return 1; }
+
+  // Calls are carried out when their message handler has returned: the library holds its lock while one runs. A handler answers
+  // only what is wrong with the message itself.
+  template <typename Result, typename Work>
+  void start(Result&& result, const BusDictionary& options, std::initializer_list<std::string_view> known, Work work) {
+    checked([&] {
+      refuseUnknownOptions(options, known);
+      const auto reply = std::make_shared<Result>(std::forward<Result>(result));
+      BusLoop::defer(
+          [reply, caller = callerOfThisMessage(), work = std::move(work)] { answer(*reply, [&] { return work(caller); }); });
+    });
+  }
+
+  template <typename Work>
+  void startRequest(AccessResult&& result, const BusDictionary& options, Work work) {
+    checked([&] {
+      refuseUnknownOptions(options, {"handle_token"});
+      const BusCaller caller = callerOfThisMessage();
+      const auto request = std::make_shared<BusRequest>(_requests, caller.uniqueName,
+                                                        optionOf<std::string>(options, "handle_token"), std::move(result));
+      BusLoop::defer([request, caller, work = std::move(work)] { carryOut(*request, [&] { return work(caller, *request); }); });
+    });
+  }
+
+  template <typename Body>
+  static void checked(const Body& body) {
+    try {
+      body();
+    } catch (const BusFailure& failure) {
+      throw busError(failure);
+    }
+  }
+
+  template <typename Work>
+  static void carryOut(BusRequest& request, const Work& work) {
+    try {
+      request.finish(work());
+    } catch (const BusFailure& failure) {
+      request.fail(failure);
+    } catch (const sdbus::Error&) {
+      throw;
+    } catch (const std::exception& failure) {
+      request.fail({BusFailureKind::failed, failure.what()});
+    }
+  }
+
+  // Who sent the message that is being handled. The bus is asked once a connection.
+  BusCaller callerOfThisMessage() {
+    const sdbus::Message* message = getObject().getCurrentlyProcessedMessage();
+    const std::string uniqueName = message->getSender();
+    const std::lock_guard lock(_mutex);
+    const auto known = _callers.find(uniqueName);
+    if (known != _callers.end()) return known->second;
+    try {
+      const BusCaller caller{.uniqueName = uniqueName,
+                             .processID = message->getCredsPid(),
+                             .userID = message->getCredsUid(),
+                             .askProcessAgain = [this, uniqueName] { return processOf(uniqueName); }};
+      return _callers.emplace(uniqueName, caller).first->second;
+    } catch (const sdbus::Error&) {
+      throw BusFailure(BusFailureKind::unknownCaller, "The bus does not say who is calling.");
+    }
+  }
+
+  // On a connection of its own: a call that waits for its reply must not take messages from under the loop.
+  pid_t processOf(const std::string& uniqueName) {
+    const std::lock_guard lock(_questionMutex);
+    if (_questions == nullptr) _questions = sdbus::createSessionBusConnection();
+    const auto bus = sdbus::createProxy(*_questions, "org.freedesktop.DBus", "/org/freedesktop/DBus");
+    std::uint32_t process = 0;
+    bus->callMethod("GetConnectionUnixProcessID")
+        .onInterface("org.freedesktop.DBus")
+        .withArguments(uniqueName)
+        .storeResultsTo(process);
+    return static_cast<pid_t>(process);
+  }
+
+  void nameVanished(sdbus::Message& message) {
+    std::string name;
+    message >> name;
+    {
+      const std::lock_guard lock(_mutex);
+      if (_callers.erase(name) == 0) return;
+    }
+    _service.callerLeft(name);
+  }
+
+  std::unique_ptr<sdbus::IConnection> _connection;
+  AccountsService& _service;
+  BusLoop _loop;
+  RequestObjects _requests;
+  std::mutex _mutex;
+  std::map<std::string, BusCaller> _callers;
+  std::mutex _questionMutex;
+  std::unique_ptr<sdbus::IConnection> _questions;
+};
+
+BusServer::BusServer(AccountsService& service)
+    : _implementation(std::make_unique<Implementation>(sdbus::createSessionBusConnection(), service)) {}
+
+BusServer::~BusServer() = default;
+
+void BusServer::run() { _implementation->loop().run(); }
+void BusServer::stop() { _implementation->loop().stop(); }
+
+void BusServer::emitAccountsChanged(const std::string& accountType) { _implementation->emitAccountsChanged(accountType); }
+
+void BusServer::emitGrantsChanged(const std::string& accountType, const std::string& client) {
+  _implementation->emitGrantsChanged(accountType, client);
+}
+
+}  // namespace palisade

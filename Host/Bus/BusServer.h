@@ -1,0 +1,35 @@
+#pragma once
+
+/// The daemon's face on the session bus: com.veltran.Accounts1.
+///
+/// Threads: `run` reads the bus on the calling thread and on followers, and returns after `stop`. The signals may be emitted
+/// from any thread. Ownership: owns its connection; borrows the service. Errors: a bus that cannot be reached, or a name that
+/// another daemon owns, is an exception that says so.
+
+#include <memory>
+#include <string>
+
+#include "Host/Bus/AccountsService.h"
+
+namespace palisade {
+
+class BusServer {
+ public:
+  explicit BusServer(AccountsService& service);
+  ~BusServer();
+
+  BusServer(const BusServer&) = delete;
+  BusServer& operator=(const BusServer&) = delete;
+
+  void run();
+  void stop();
+
+  void emitAccountsChanged(const std::string& accountType);
+  void emitGrantsChanged(const std::string& accountType, const std::string& client);
+
+ private:
+  class Implementation;
+  std::unique_ptr<Implementation> _implementation;
+};
+
+}  // namespace palisade

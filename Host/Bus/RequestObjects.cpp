@@ -1,0 +1,136 @@
+#include "Host/Bus/RequestObjects.h"
+
+#include <algorithm>
+#include <random>
+
+namespace palisade {
+namespace {
+
+constexpr const char* requestInterface = "com.veltran.Accounts1.Request";
+constexpr std::size_t longestToken = 64;
+
+std::string pathElement(std::string uniqueName) {
+  std::erase(uniqueName, ':');
+  std::ranges::replace(uniqueName, '.', '_');
+  return uniqueName;
+}
+
+bool isPathElement(const std::string& token) {
+  const auto mayStand = [](char character) {
+    return (character >= 'a' && character <= 'z') || (character >= 'A' && character <= 'Z') ||
+           (character >= '0' && character <= '9') || character == '_';
+  };
+  return !token.empty() && token.size() <= longestToken && std::ranges::all_of(token, mayStand);
+}
+
+std::string randomToken() {
+  std::random_device random;
+  return "t" + std::to_string(std::uint64_t{random()} << 32 | random());
+}
+
+BusDictionary resultsOf(const AccessOutcome& outcome) {
+  BusDictionary results;
+  if (!outcome.error) return results;
+  results.emplace("error_domain", outcome.error->domain);
+  results.emplace("error_code", std::int32_t{outcome.error->code});
+  if (outcome.error->description) results.emplace("error_message", *outcome.error->description);
+  return results;
+}
+
+const char* nameOf(BusFailureKind kind) {
+  switch (kind) {
+    case BusFailureKind::invalidArguments: return "InvalidArguments";
+    case BusFailureKind::notPermitted: return "NotPermitted";
+    case BusFailureKind::unknownCaller: return "UnknownCaller";
+    case BusFailureKind::noSuchAccount: return "NoSuchAccount";
+    case BusFailureKind::noSuchClient: return "NoSuchClient";
+    case BusFailureKind::notGranted: return "NotGranted";
+    case BusFailureKind::tooManyRequests: return "TooManyRequests";
+    case BusFailureKind::keychainUnavailable: return "KeychainUnavailable";
+    case BusFailureKind::storeUnavailable: return "StoreUnavailable";
+    case BusFailureKind::failed: break;
+  }
+  return "Failed";
+}
+
+}  // namespace
+
+sdbus::Error busError(const BusFailure& failure) {
+  return sdbus::Error(std::string("com.veltran.Accounts1.Error.") + nameOf(failure.kind()), failure.what());
+}
+
+RequestObjects::RequestObjects(sdbus::IConnection& connection, std::function<void(std::uint64_t)> close)
+    : _connection(connection),
+      _close(std::move(close)) {}
+
+std::shared_ptr<const std::string> RequestObjects::reserve(const std::string& caller, const std::string& token) {
+  if (!isPathElement(token)) {
+    throw BusFailure(BusFailureKind::invalidArguments,
+                     "'handle_token' may hold up to 64 letters, digits and underscores, and nothing else.");
+  }
+  const std::string path = "/com/veltran/Accounts1/request/" + pathElement(caller) + "/" + token;
+  const std::lock_guard lock(_mutex);
+  if (!_paths.insert(path).second) {
+    throw BusFailure(BusFailureKind::invalidArguments, "'handle_token' names a request of yours that still waits.");
+  }
+  return {new std::string(path), [this](const std::string* reserved) {
+            {
+              const std::lock_guard guard(_mutex);
+              _paths.erase(*reserved);
+            }
+            delete reserved;
+          }};
+}
+
+BusRequest::BusRequest(RequestObjects& objects, std::string caller, const std::optional<std::string>& token,
+                       AccessResult result)
+    : _objects(objects),
+      _caller(std::move(caller)),
+      _identifier(++objects._lastIdentifier),
+      _path(objects.reserve(_caller, token ? *token : randomToken())),
+      _result(std::move(result)) {}
+
+BusRequest::~BusRequest() = default;
+
+void BusRequest::becomePending() {
+  if (_object != nullptr) return;
+  _object = sdbus::createObject(_objects._connection, *_path);
+  _object->registerMethod("Close")
+      .onInterface(requestInterface)
+      .withInputParamNames("options")
+      .implementedAs([this, object = _object.get()](const BusDictionary&) {
+        if (object->getCurrentlyProcessedMessage()->getSender() != _caller) {
+          throw busError({BusFailureKind::notPermitted, "This request belongs to another connection."});
+        }
+        _objects._close(_identifier);
+      });
+  _object->registerSignal("Response")
+      .onInterface(requestInterface)
+      .withParameters<std::uint32_t, BusDictionary>("response", "results");
+  _object->finishRegistration();
+  _result.returnResults(sdbus::ObjectPath(*_path), static_cast<std::uint32_t>(AccessResponse::pending), {});
+}
+
+void BusRequest::finish(const AccessOutcome& outcome) {
+  const auto response = static_cast<std::uint32_t>(outcome.response);
+  if (_object == nullptr) {
+    _result.returnResults(sdbus::ObjectPath("/"), response, resultsOf(outcome));
+    return;
+  }
+  auto signal = _object->createSignal(requestInterface, "Response");
+  signal << response << resultsOf(outcome);
+  signal.setDestination(_caller);
+  _object->emitSignal(signal);
+}
+
+void BusRequest::fail(const BusFailure& failure) {
+  if (_object == nullptr) {
+    _result.returnError(busError(failure));
+    return;
+  }
+  const auto error = busError(failure);
+  finish({.response = AccessResponse::refused,
+          .error = Error{.domain = error.getName(), .code = 0, .description = failure.what()}});
+}
+
+}  // namespace palisade
