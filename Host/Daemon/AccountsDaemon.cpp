@@ -1,0 +1,351 @@
+#include "Host/Daemon/AccountsDaemon.h"
+
+#include <algorithm>
+#include <future>
+
+#include "Host/Accounts/StoredAccount.h"
+#include "Host/Bus/BusLoop.h"
+#include "Host/Daemon/OperationStore.h"
+#include "Platform/AccountConstants.h"
+#include "Platform/AccountType.h"
+
+namespace palisade {
+namespace {
+
+constexpr std::size_t longestToken = 64 * 1024;
+
+Value textOrNull(const std::optional<std::string>& text) { return text ? Value(*text) : Value(); }
+
+Array namesOf(const PermissionSetRef& permissions) {
+  if (permissions == nullptr) return {};
+  std::vector<std::string> names(permissions->begin(), permissions->end());
+  std::ranges::sort(names);
+  return {names.begin(), names.end()};
+}
+
+std::int64_t unixTime(Date date) { return date.time_since_epoch().count(); }
+
+Value optionOf(const ClientAuthorization& record, std::string_view key) {
+  const Value* value = record.options() == nullptr ? nullptr : record.options()->find(key);
+  return value == nullptr ? Value() : *value;
+}
+
+Dictionary rowOf(const StoredAuthorization& stored) {
+  const ClientAuthorization& record = *stored.record;
+  return {{"client", stored.clientID},
+          {"name", record.client()->localizedAppName()},
+          {"account_type", stored.accountTypeIdentifier},
+          {"granted", record.isGranted()},
+          {"app_id", optionOf(record, FacebookAppIdKey)},
+          {"audience", optionOf(record, FacebookAudienceKey)},
+          {"permissions", namesOf(record.grantedPermissions())},
+          {"changed", unixTime(stored.updatedAt)}};
+}
+
+/// Runs a piece of work when the scope ends.
+template <typename Work>
+class AtEnd {
+ public:
+  explicit AtEnd(Work work) : _work(std::move(work)) {}
+  AtEnd(const AtEnd&) = delete;
+  AtEnd& operator=(const AtEnd&) = delete;
+  ~AtEnd() { _work(); }
+
+ private:
+  Work _work;
+};
+
+}  // namespace
+
+AccessOutcome AccountsDaemon::requestAccess(const BusCaller& caller, const std::string& accountType,
+                                            const Dictionary& accessOptions, PendingRequest& request) {
+  const auto client = clientOf(caller);
+  const auto options = std::make_shared<const Dictionary>(accessOptions);
+  return carryOut(caller, client, accountType, request,
+                  [&](auto& plugin, const auto& type, const auto& store, auto completion) {
+                    plugin.handleAccessRequestToAccountsOfType(type, client, options, store, true, std::move(completion));
+                  });
+}
+
+AccessOutcome AccountsDaemon::authorize(const BusCaller& caller, const std::string& accountType, const std::string& clientID,
+                                        PendingRequest& request) {
+  refuseUnlessManager(caller);
+  const auto client = registeredClient(clientID);
+  return carryOut(caller, client, accountType, request,
+                  [&](auto& plugin, const auto& type, const auto& store, auto completion) {
+                    // The person who manages grants has decided; what is stored is their answer.
+                    Operation::current()->userHasAnswered();
+                    Operation::current()->aboutToWait();
+                    plugin.authorizeAccessToAccountsOfType(type, client, store, std::move(completion));
+                  });
+}
+
+AccessOutcome AccountsDaemon::carryOut(const BusCaller& caller, const std::shared_ptr<const RegisteredClient>& client,
+                                       const std::string& accountType, PendingRequest& request, const PluginCall& call) {
+  const auto plugin = pluginFor(accountType);
+  const auto operation = std::make_shared<Operation>([&request] {
+    request.becomePending();
+    BusLoop::handOver();
+  });
+  {
+    const std::lock_guard lock(_mutex);
+    _running.emplace(
+        operation.get(),
+        Running{.operation = operation, .caller = caller.uniqueName, .client = client->id(), .request = request.identifier()});
+  }
+  const AtEnd forget([&] {
+    const std::lock_guard lock(_mutex);
+    _running.erase(operation.get());
+  });
+
+  try {
+    const auto turn = _lanes.enter(client->id(), ClientLanes::Bound::kept, [&] { operation->aboutToWait(); });
+    if (operation->isWithdrawn()) return {.response = AccessResponse::withdrawn};
+
+    const OperationScope scope(*operation);
+    const auto outcome = std::make_shared<std::promise<AccessOutcome>>();
+    auto answer = outcome->get_future();
+    call(*plugin, std::make_shared<const AccountType>(accountType), std::make_shared<OperationStore>(_parts.store, operation),
+         [outcome](bool granted, const std::optional<Error>& error) {
+           outcome->set_value({.response = granted ? AccessResponse::granted : AccessResponse::refused, .error = error});
+         });
+    if (answer.wait_for(std::chrono::seconds(0)) != std::future_status::ready) operation->aboutToWait();
+    AccessOutcome result = answer.get();
+
+    if (!operation->isAnsweredByUser() && result.response != AccessResponse::granted) {
+      _parts.store.removeAnswersByNobodyForClient(*client);
+      if (operation->isWithdrawn()) result.response = AccessResponse::withdrawn;
+    }
+    return result;
+  } catch (const LaneIsFull& failure) {
+    throw BusFailure(BusFailureKind::tooManyRequests, failure.what());
+  }
+}
+
+std::string AccountsDaemon::credential(const BusCaller& caller, const std::string& accountType) {
+  const auto client = clientOf(caller);
+  pluginFor(accountType);
+  const auto record = _parts.store.authorizationForClient(client, AccountType(accountType));
+  if (record == nullptr || !record->isGranted()) {
+    throw BusFailure(BusFailureKind::notGranted,
+                     client->description() + " was not granted access. Ask with RequestAccess first.");
+  }
+  const auto accounts = _parts.store.accountsWithAccountTypeIdentifier(accountType);
+  if (accounts.empty())
+    throw BusFailure(BusFailureKind::noSuchAccount, "There is no account of the type '" + accountType + "'.");
+  try {
+    const auto credential = _parts.keychain.credentialForAccount(accounts.front(), client->bundleID());
+    if (client->bundleID() && credential != nullptr && credential->oauthToken()) return *credential->oauthToken();
+  } catch (const std::exception& failure) {
+    throw BusFailure(BusFailureKind::keychainUnavailable, failure.what());
+  }
+  throw BusFailure(BusFailureKind::notGranted, "The grant of " + client->description() + " carries no token. Ask again.");
+}
+
+Rows AccountsDaemon::listAccounts(const BusCaller& caller, const std::string& accountType) {
+  refuseUnlessManager(caller);
+  Rows rows;
+  for (const AccountRecord& account : _parts.store.accounts()) {
+    if (!accountType.empty() && account.accountTypeIdentifier != accountType) continue;
+    rows.push_back({{"id", account.id},
+                    {"account_type", account.accountTypeIdentifier},
+                    {"username", account.username},
+                    {"description", account.description}});
+  }
+  return rows;
+}
+
+std::string AccountsDaemon::addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
+                                       std::string token) {
+  refuseUnlessManager(caller);
+  pluginFor(accountType);
+  while (token.ends_with('\n') || token.ends_with('\r')) token.pop_back();
+  if (username.empty()) throw BusFailure(BusFailureKind::invalidArguments, "An account needs a user name.");
+  if (token.empty() || token.size() > longestToken) {
+    throw BusFailure(BusFailureKind::invalidArguments, "An account needs a token of at most 64 KiB.");
+  }
+  BusLoop::handOver();
+  const AccountRecord record = _parts.store.addAccount(accountType, username, username);
+  const auto account = std::make_shared<StoredAccount>(record.id, record.username, record.description);
+  account->setCredential(std::make_shared<const AccountCredential>(std::move(token), "", distantFuture));
+  if (const auto error = _parts.keychain.setCredentialForAccount(account, std::nullopt)) {
+    _parts.store.removeAccount(record.id);
+    throw BusFailure(BusFailureKind::keychainUnavailable, error->description.value_or("The keychain refused the token."));
+  }
+  return record.id;
+}
+
+void AccountsDaemon::removeAccount(const BusCaller& caller, const std::string& id) {
+  refuseUnlessManager(caller);
+  const auto accounts = _parts.store.accounts();
+  const auto found = std::ranges::find(accounts, id, &AccountRecord::id);
+  if (found == accounts.end()) {
+    throw BusFailure(BusFailureKind::noSuchAccount, "There is no account '" + id + "'. `palisade account list` shows them.");
+  }
+  // What was granted belongs to the first account of its type; only that one's removal takes it along.
+  const auto first = std::ranges::find(accounts, found->accountTypeIdentifier, &AccountRecord::accountTypeIdentifier);
+  if (first == found) revokeAll(caller, found->accountTypeIdentifier);
+  BusLoop::handOver();
+  const auto account = std::make_shared<StoredAccount>(found->id, found->username, found->description);
+  if (const auto error = _parts.keychain.removeCredentialForAccount(account, std::nullopt)) {
+    throw BusFailure(BusFailureKind::keychainUnavailable,
+                     error->description.value_or("The keychain kept the account's token."));
+  }
+  _parts.store.removeAccount(id);
+}
+
+Rows AccountsDaemon::listGrants(const BusCaller& caller, const std::string& accountType) {
+  refuseUnlessManager(caller);
+  Rows rows;
+  for (const StoredAuthorization& stored : _parts.store.storedAuthorizations(accountType)) rows.push_back(rowOf(stored));
+  return rows;
+}
+
+void AccountsDaemon::revoke(const BusCaller& caller, const std::string& accountType, const std::string& clientID) {
+  refuseUnlessManager(caller);
+  const auto stored = _parts.store.storedAuthorizations(accountType);
+  const auto found = std::ranges::find(stored, clientID, &StoredAuthorization::clientID);
+  std::shared_ptr<const Client> client;
+  if (found != stored.end()) {
+    client = found->record->client();
+  } else {
+    client = registeredClient(clientID);
+  }
+  withdraw([&](const Running& running) { return running.client == clientID; });
+  BusLoop::handOver();
+  const auto turn = _lanes.enter(clientID, ClientLanes::Bound::waived, [] {});
+  manage(accountType, [&](auto& plugin, const auto& type, const auto& store, auto completion) {
+    plugin.revokeAccessToAccountsOfType(type, client, store, std::move(completion));
+  });
+}
+
+void AccountsDaemon::revokeAll(const BusCaller& caller, const std::string& accountType) {
+  refuseUnlessManager(caller);
+  withdraw([](const Running&) { return true; });
+  BusLoop::handOver();
+  const auto turn = _lanes.enterAll([] {});
+  manage(accountType, [&](auto& plugin, const auto& type, const auto& store, auto completion) {
+    plugin.revokeAllAccessToAccountsOfType(type, store, std::move(completion));
+  });
+}
+
+// A revocation says that it was handled, or why it was not.
+void AccountsDaemon::manage(const std::string& accountType, const PluginCall& call) {
+  const auto plugin = pluginFor(accountType);
+  const auto operation = std::make_shared<Operation>(nullptr);
+  operation->userHasAnswered();
+  const OperationScope scope(*operation);
+  std::promise<AccessOutcome> outcome;
+  call(*plugin, std::make_shared<const AccountType>(accountType), std::make_shared<OperationStore>(_parts.store, operation),
+       [&](bool handled, const std::optional<Error>& error) {
+         outcome.set_value({.response = handled ? AccessResponse::granted : AccessResponse::refused, .error = error});
+       });
+  const AccessOutcome result = outcome.get_future().get();
+  if (result.response != AccessResponse::granted) {
+    throw BusFailure(BusFailureKind::failed, result.error && result.error->description ? *result.error->description
+                                                                                       : "The revocation was not carried out.");
+  }
+}
+
+Rows AccountsDaemon::history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) {
+  refuseUnlessManager(caller);
+  Rows rows;
+  for (const HistoryEntry& entry : _parts.store.history({.limit = limit, .bundleID = client})) {
+    rows.push_back({{"time", unixTime(entry.at)},
+                    {"account_type", entry.accountTypeIdentifier},
+                    {"client", textOrNull(entry.bundleID)},
+                    {"granted", entry.granted},
+                    {"prompted", entry.userPrompted},
+                    {"elapsed", entry.elapsedSeconds}});
+  }
+  return rows;
+}
+
+Rows AccountsDaemon::listRevocations(const BusCaller& caller) {
+  refuseUnlessManager(caller);
+  return _parts.revocations();
+}
+
+Rows AccountsDaemon::listClients(const BusCaller& caller) {
+  refuseUnlessManager(caller);
+  Rows rows;
+  for (const auto& client : _parts.clients.clients()) {
+    rows.push_back({{"bundle_id", textOrNull(client->bundleID())},
+                    {"name", client->localizedAppName()},
+                    {"class", nameOf(client->clientClass())},
+                    {"entitlements", Array(client->entitlements().begin(), client->entitlements().end())},
+                    {"file", client->recordFile()}});
+  }
+  return rows;
+}
+
+Dictionary AccountsDaemon::status(const BusCaller& caller) {
+  refuseUnlessManager(caller);
+  return _parts.status();
+}
+
+void AccountsDaemon::close(std::uint64_t requestIdentifier) {
+  withdraw([&](const Running& running) { return running.request == requestIdentifier; });
+}
+
+void AccountsDaemon::callerLeft(const std::string& uniqueName) {
+  {
+    const std::lock_guard lock(_mutex);
+    _clientsByConnection.erase(uniqueName);
+  }
+  withdraw([&](const Running& running) { return running.caller == uniqueName; });
+}
+
+void AccountsDaemon::withdrawAll() {
+  withdraw([](const Running&) { return true; });
+}
+
+void AccountsDaemon::withdraw(const Withdrawable& isMeant) {
+  std::vector<std::shared_ptr<Operation>> meant;
+  {
+    const std::lock_guard lock(_mutex);
+    for (const auto& [operation, running] : _running) {
+      if (isMeant(running)) meant.push_back(running.operation);
+    }
+  }
+  for (const auto& operation : meant) operation->withdraw();
+}
+
+std::shared_ptr<const RegisteredClient> AccountsDaemon::clientOf(const BusCaller& caller) {
+  {
+    const std::lock_guard lock(_mutex);
+    const auto known = _clientsByConnection.find(caller.uniqueName);
+    if (known != _clientsByConnection.end()) return known->second;
+  }
+  try {
+    const auto client = _parts.clients.identify(caller.processID, caller.askProcessAgain);
+    const std::lock_guard lock(_mutex);
+    return _clientsByConnection.emplace(caller.uniqueName, client).first->second;
+  } catch (const std::exception& failure) {
+    throw BusFailure(BusFailureKind::unknownCaller, failure.what());
+  }
+}
+
+void AccountsDaemon::refuseUnlessManager(const BusCaller& caller) {
+  if (clientOf(caller)->clientClass() == ClientClass::sandboxed) {
+    throw BusFailure(BusFailureKind::notPermitted, "A sandboxed application may not manage accounts and grants.");
+  }
+}
+
+std::shared_ptr<const RegisteredClient> AccountsDaemon::registeredClient(const std::string& id) const {
+  auto client = _parts.clients.clientWithID(id);
+  if (client == nullptr) {
+    throw BusFailure(BusFailureKind::noSuchClient, "There is no client '" + id + "'. `palisade clients` shows them.");
+  }
+  return client;
+}
+
+std::shared_ptr<AccountAccessPlugin> AccountsDaemon::pluginFor(const std::string& accountType) const {
+  auto plugin = _parts.pluginFor(accountType);
+  if (plugin == nullptr) {
+    throw BusFailure(BusFailureKind::invalidArguments, "No plug-in serves the account type '" + accountType + "'.");
+  }
+  return plugin;
+}
+
+}  // namespace palisade

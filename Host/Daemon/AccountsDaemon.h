@@ -1,0 +1,99 @@
+#pragma once
+
+/// The daemon's decisions about who may call what, and the order in which operations run. Everything about access itself is the
+/// plug-in's.
+///
+/// Threads: see `AccountsService`. One operation of a client at a time, in order; operations of different clients run beside
+/// each other. A revocation first withdraws what its client waits for. Ownership: borrows its parts. Errors: `BusFailure`.
+
+#include <functional>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <string>
+#include <vector>
+
+#include "Host/Accounts/SqliteAccountStore.h"
+#include "Host/Bus/AccountsService.h"
+#include "Host/Daemon/ClientLanes.h"
+#include "Host/Daemon/Operation.h"
+#include "Host/Identity/ClientRegistry.h"
+#include "Host/Keychain/Keychain.h"
+#include "Platform/AccountAccessPlugin.h"
+
+namespace palisade {
+
+class AccountsDaemon final : public AccountsService {
+ public:
+  /// The plug-in that serves an account type, or null.
+  using PluginFinder = std::function<std::shared_ptr<AccountAccessPlugin>(std::string_view accountType)>;
+
+  struct Parts {
+    SqliteAccountStore& store;
+    Keychain& keychain;
+    const ClientRegistry& clients;
+    PluginFinder pluginFor;
+    std::function<Rows()> revocations;
+    std::function<Dictionary()> status;
+  };
+
+  explicit AccountsDaemon(Parts parts) : _parts(std::move(parts)), _lanes(longestLane) {}
+
+  AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType, const Dictionary& accessOptions,
+                              PendingRequest& request) override;
+  AccessOutcome authorize(const BusCaller& caller, const std::string& accountType, const std::string& client,
+                          PendingRequest& request) override;
+  std::string credential(const BusCaller& caller, const std::string& accountType) override;
+
+  Rows listAccounts(const BusCaller& caller, const std::string& accountType) override;
+  std::string addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
+                         std::string token) override;
+  void removeAccount(const BusCaller& caller, const std::string& id) override;
+
+  Rows listGrants(const BusCaller& caller, const std::string& accountType) override;
+  void revoke(const BusCaller& caller, const std::string& accountType, const std::string& client) override;
+  void revokeAll(const BusCaller& caller, const std::string& accountType) override;
+
+  Rows history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) override;
+  Rows listRevocations(const BusCaller& caller) override;
+  Rows listClients(const BusCaller& caller) override;
+  Dictionary status(const BusCaller& caller) override;
+
+  void close(std::uint64_t requestIdentifier) override;
+  void callerLeft(const std::string& uniqueName) override;
+
+  /// Withdraws everything that waits; the daemon is about to end.
+  void withdrawAll();
+
+ private:
+  static constexpr std::size_t longestLane = 8;
+
+  /// An operation that may be withdrawn, and by whom.
+  struct Running {
+    std::shared_ptr<Operation> operation;
+    std::string caller;
+    std::string client;
+    std::uint64_t request;
+  };
+  using Withdrawable = std::function<bool(const Running&)>;
+  using PluginCall = std::function<void(AccountAccessPlugin&, const std::shared_ptr<const AccountType>&,
+                                        const std::shared_ptr<AccountStore>&, AccessCompletion)>;
+
+  std::shared_ptr<const RegisteredClient> clientOf(const BusCaller& caller);
+  void refuseUnlessManager(const BusCaller& caller);
+  std::shared_ptr<const RegisteredClient> registeredClient(const std::string& id) const;
+  std::shared_ptr<AccountAccessPlugin> pluginFor(const std::string& accountType) const;
+
+  AccessOutcome carryOut(const BusCaller& caller, const std::shared_ptr<const RegisteredClient>& client,
+                         const std::string& accountType, PendingRequest& request, const PluginCall& call);
+  void manage(const std::string& accountType, const PluginCall& call);
+  void withdraw(const Withdrawable& isMeant);
+
+  Parts _parts;
+  ClientLanes _lanes;
+  std::mutex _mutex;
+  std::map<std::string, std::shared_ptr<const RegisteredClient>> _clientsByConnection;
+  std::map<Operation*, Running> _running;
+};
+
+}  // namespace palisade

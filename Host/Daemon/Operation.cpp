@@ -1,0 +1,46 @@
+#include "Host/Daemon/Operation.h"
+
+#include <utility>
+
+namespace palisade {
+namespace {
+
+thread_local Operation* currentOperation = nullptr;
+
+}  // namespace
+
+Operation* Operation::current() { return currentOperation; }
+
+OperationScope::OperationScope(Operation& operation) { currentOperation = &operation; }
+OperationScope::~OperationScope() { currentOperation = nullptr; }
+
+void Operation::aboutToWait() {
+  if (const auto first = std::exchange(_beforeFirstWait, nullptr)) first();
+}
+
+void Operation::withdraw() {
+  std::shared_ptr<const std::function<void()>> interrupt;
+  {
+    const std::lock_guard lock(_mutex);
+    _isWithdrawn.store(true, std::memory_order_release);
+    interrupt = _interrupt;
+  }
+  if (interrupt != nullptr) (*interrupt)();
+}
+
+std::shared_ptr<const void> Operation::interruptWith(std::function<void()> interrupt) {
+  auto registered = std::make_shared<const std::function<void()>>(std::move(interrupt));
+  bool isWithdrawnAlready = false;
+  {
+    const std::lock_guard lock(_mutex);
+    _interrupt = registered;
+    isWithdrawnAlready = isWithdrawn();
+  }
+  if (isWithdrawnAlready) (*registered)();
+  return std::shared_ptr<const void>(registered.get(), [this, registered](const void*) {
+    const std::lock_guard lock(_mutex);
+    _interrupt = nullptr;
+  });
+}
+
+}  // namespace palisade

@@ -1,0 +1,58 @@
+#pragma once
+
+/// One operation that a client asked for, while it is carried out.
+///
+/// Purpose: services that the plug-in calls learn from it for whom they work, tell it that they are about to wait, and hear
+/// from it that the operation was withdrawn. Threads: made and ended by the thread that carries the operation, whose current
+/// operation it then is; `withdraw` comes from any thread. Ownership: shared with whoever may withdraw it. Errors: none.
+
+#include <atomic>
+#include <functional>
+#include <memory>
+#include <mutex>
+
+namespace palisade {
+
+class Operation {
+ public:
+  /// `beforeFirstWait` is called once, on the operation's thread, before it waits for a user or a server.
+  explicit Operation(std::function<void()> beforeFirstWait) : _beforeFirstWait(std::move(beforeFirstWait)) {}
+
+  /// The operation that the calling thread carries, or null.
+  static Operation* current();
+
+  /// The operation may wait for long from here on.
+  void aboutToWait();
+
+  /// Ends what the operation waits for, now or later; from then on nobody will answer it.
+  void withdraw();
+  bool isWithdrawn() const { return _isWithdrawn.load(std::memory_order_acquire); }
+
+  /// Calls `interrupt` when the operation is withdrawn while the result lives, or at once if it has been.
+  [[nodiscard]] std::shared_ptr<const void> interruptWith(std::function<void()> interrupt);
+
+  /// Whether the user has answered: pressed one of the two buttons.
+  void userHasAnswered() { _userAnswered.store(true, std::memory_order_release); }
+  bool isAnsweredByUser() const { return _userAnswered.load(std::memory_order_acquire); }
+
+ private:
+  friend class OperationScope;
+
+  std::function<void()> _beforeFirstWait;
+  std::atomic<bool> _isWithdrawn = false;
+  std::atomic<bool> _userAnswered = false;
+  std::mutex _mutex;
+  std::shared_ptr<const std::function<void()>> _interrupt;
+};
+
+/// Makes an operation the calling thread's current one.
+class OperationScope {
+ public:
+  explicit OperationScope(Operation& operation);
+  ~OperationScope();
+
+  OperationScope(const OperationScope&) = delete;
+  OperationScope& operator=(const OperationScope&) = delete;
+};
+
+}  // namespace palisade
