@@ -63,10 +63,9 @@ void Database::createStore(const StoreOptions& options) {
   {
     Database database(unfinished.path(), SQLITE_OPEN_READWRITE, options.busyTimeout);
     database.makeDurable();
-    Transaction transaction(database);
-    database.execute("mark the store as ours", ("PRAGMA application_id=" + std::to_string(options.applicationID)).c_str());
-    transaction.commit();
     database.migrate(options);
+    // Closing would move the log into the file too, but keeps to itself when it fails.
+    database.execute("make the store", "PRAGMA wal_checkpoint(TRUNCATE)");
   }
   unfinished.publish();
 }
@@ -135,7 +134,9 @@ void Database::migrate(const StoreOptions& options) {
   for (std::size_t next = version; next < options.migrations.size(); ++next) {
     execute("bring the store up to date", std::string(options.migrations[next]).c_str());
   }
-  execute("bring the store up to date", ("PRAGMA user_version=" + std::to_string(options.migrations.size())).c_str());
+  execute("bring the store up to date", ("PRAGMA application_id=" + std::to_string(options.applicationID) +
+                                         "; PRAGMA user_version=" + std::to_string(options.migrations.size()))
+                                            .c_str());
   transaction.commit();
 }
 

@@ -10,7 +10,7 @@ struct Meaning {
   std::string_view advice;
 };
 
-// The disk is at its end in three ways: no space, a quota, and a limit on the size of files, which arrives as a failed write.
+// A disk without space is told apart from a failing one; a quota that is used up is not, which its advice has to make good for.
 Meaning meaningOf(int resultCode) {
   switch (resultCode & 0xff) {
     case SQLITE_FULL: return {StoreErrorFull, "the disk is full; free some space and try again"};
@@ -25,7 +25,8 @@ Meaning meaningOf(int resultCode) {
     case SQLITE_BUSY:
     case SQLITE_LOCKED: return {StoreErrorBusy, "another process is using it; end that process or try again"};
     case SQLITE_CONSTRAINT: return {StoreErrorConstraint, "that contradicts what is stored"};
-    case SQLITE_IOERR: return {StoreErrorOther, "the disk or its file system failed; look into the system's log"};
+    case SQLITE_IOERR:
+      return {StoreErrorOther, "the disk failed or a quota is used up; look at the free space and into the system's log"};
     case SQLITE_NOMEM: return {StoreErrorOther, "there is not enough memory"};
     default: return {StoreErrorOther, ""};
   }
