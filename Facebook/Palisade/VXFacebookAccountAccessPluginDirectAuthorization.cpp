@@ -14,6 +14,7 @@
 #include "Platform/AccountType.h"
 #include "Platform/AuthorizationManager.h"
 #include "Platform/Client.h"
+#include "Platform/Format.h"
 
 namespace palisade {
 namespace {
@@ -69,7 +70,7 @@ PermissionSetRef VXFacebookAccountAccessPlugin::_permissionsGrantedByServer(cons
       client, appID, nullptr, std::nullopt, account,
       [granted = std::move(granted)](bool, const std::optional<Array>& permissions, const std::optional<Error>& error) {
         if (isUnexpectedFailure(error)) {
-          granted->set_exception(std::make_exception_ptr(std::runtime_error(*error->description)));
+          granted->set_exception(std::make_exception_ptr(std::runtime_error(error->description.value_or(describe(*error)))));
         } else {
           granted->set_value(
               std::make_shared<const PermissionSet>(permissions ? permissionSetFromArray(*permissions) : PermissionSet()));
