@@ -29,11 +29,13 @@ struct Problem {
 // Walks the text and leaves behind how far the library has read: its events do not tell where they happened.
 class TrackingIterator {
  public:
+  // NOLINTBEGIN(readability-identifier-naming): the standard library's names
   using iterator_category = std::input_iterator_tag;
   using value_type = char;
   using difference_type = std::ptrdiff_t;
   using pointer = const char*;
   using reference = const char&;
+  // NOLINTEND(readability-identifier-naming)
 
   TrackingIterator(const char* position, const char*& reached) : _position(position), _reached(&reached) {}
 
@@ -83,6 +85,7 @@ class ValueBuilder {
  public:
   explicit ValueBuilder(std::size_t maximumDepth) : _maximumDepth(maximumDepth) {}
 
+  // NOLINTBEGIN(readability-identifier-naming): the library's names
   bool null() { return add(nullptr); }
   bool boolean(bool value) { return add(value); }
   bool number_integer(std::int64_t value) { return add(value); }
@@ -91,9 +94,9 @@ class ValueBuilder {
   bool string(std::string& value) { return isFreeOfNull(value) && add(std::move(value)); }
   bool binary(nlohmann::json::binary_t&) { return fail(JsonErrorMalformed, "JSON has no binary values"); }
 
-  bool start_object(std::size_t) { return open(Kind::object); }
+  bool start_object(std::size_t) { return open(Kind::Object); }
   bool end_object() { return close(); }
-  bool start_array(std::size_t) { return open(Kind::array); }
+  bool start_array(std::size_t) { return open(Kind::Array); }
   bool end_array() { return close(); }
 
   bool key(std::string& name) {
@@ -112,6 +115,7 @@ class ValueBuilder {
     const std::string_view message = error.what();
     return fail(JsonErrorMalformed, reasonForMessage(message.substr(0, message.find("; last read"))));
   }
+  // NOLINTEND(readability-identifier-naming)
 
   std::optional<Value>& value() { return _value; }
   const std::optional<Problem>& problem() const { return _problem; }
@@ -120,7 +124,7 @@ class ValueBuilder {
   const std::optional<std::size_t>& errorPosition() const { return _errorPosition; }
 
  private:
-  enum class Kind { array, object };
+  enum class Kind { Array, Object };
 
   // An array or object whose end has not been read, with the name that the next member gets.
   struct Level {
@@ -142,7 +146,7 @@ class ValueBuilder {
   bool add(Value value) {
     if (_open.empty()) {
       _value = std::move(value);
-    } else if (Level& level = _open.back(); level.kind == Kind::array) {
+    } else if (Level& level = _open.back(); level.kind == Kind::Array) {
       level.elements.push_back(std::move(value));
     } else {
       level.members.set(std::move(level.name), std::move(value));
@@ -159,7 +163,7 @@ class ValueBuilder {
   bool close() {
     Level level = std::move(_open.back());
     _open.pop_back();
-    return level.kind == Kind::array ? add(std::move(level.elements)) : add(std::move(level.members));
+    return level.kind == Kind::Array ? add(std::move(level.elements)) : add(std::move(level.members));
   }
 
   std::size_t _maximumDepth;

@@ -48,8 +48,6 @@ std::size_t positionOfInvalidUtf8(std::string_view text) {
 }
 
 TextPlace placeInText(std::string_view text, std::size_t position) {
-  position = std::min(position, text.size());
-  while (position > 0 && position < text.size() && isContinuation(text[position])) --position;
   const std::string_view before = text.substr(0, position);
   const std::size_t lineStart = before.rfind('\n') + 1;  // npos + 1 is 0: the first line
   const auto line = std::count(before.begin(), before.end(), '\n');

@@ -18,7 +18,7 @@ struct TextPlace {
   std::size_t column = 1;
 };
 
-/// The place of the character that holds the byte at `position`. The text before it is UTF-8.
+/// The place of the character that begins at `position`, which is at most the text's size. The text before it is UTF-8.
 TextPlace placeInText(std::string_view text, std::size_t position);
 
 }  // namespace palisade
