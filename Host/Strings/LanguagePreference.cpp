@@ -65,13 +65,11 @@ bool writesTraditionalChinese(std::string_view region) { return region == "TW" |
 // Chinese catalogues are named after a region, but readers choose a script: a reader of one script is not given the other.
 std::vector<std::string> chineseCatalogues(const Language& chinese) {
   const bool traditional = chinese.script.empty() ? writesTraditionalChinese(chinese.region) : chinese.script == "hant";
-  std::vector<std::string> catalogues;
-  if (!chinese.region.empty() && writesTraditionalChinese(chinese.region) == traditional) {
-    catalogues.push_back("zh_" + chinese.region);
-  }
-  catalogues.push_back(traditional ? "zh_TW" : "zh_CN");
-  catalogues.push_back("zh");
-  return catalogues;
+  const std::string common = traditional ? "zh_TW" : "zh_CN";
+  const std::string regional = "zh_" + chinese.region;
+  const bool fits = !chinese.region.empty() && writesTraditionalChinese(chinese.region) == traditional;
+  if (fits && regional != common) return {regional, common, "zh"};
+  return {common, "zh"};
 }
 
 // The names of the languages in the environment: the first variable that says something decides.
