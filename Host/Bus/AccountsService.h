@@ -97,6 +97,9 @@ class AccountsService {
   virtual Rows history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) = 0;
   virtual Rows listRevocations(const BusCaller& caller) = 0;
   virtual Rows listClients(const BusCaller& caller) = 0;
+  virtual std::optional<Value> preference(const BusCaller& caller, const std::string& domain, const std::string& key) = 0;
+  virtual void setPreference(const BusCaller& caller, const std::string& domain, const std::string& key,
+                             const std::optional<Value>& value) = 0;
   virtual Dictionary status(const BusCaller& caller) = 0;
 
   /// The caller withdraws a pending request of its own.

@@ -11,6 +11,7 @@
 
 #include "DBus/Accounts1Adaptor.h"
 #include "Host/Bus/BusLoop.h"
+#include "Host/Bus/BusNotifications.h"
 #include "Host/Bus/RequestObjects.h"
 
 namespace palisade {
@@ -34,6 +35,14 @@ void refuseUnknownOptions(const BusDictionary& options, std::initializer_list<st
     if (std::find(known.begin(), known.end(), key) == known.end()) {
       throw BusFailure(BusFailureKind::invalidArguments, "There is no option '" + key + "'.");
     }
+  }
+}
+
+Dictionary requestedOptions(const BusDictionary& options) {
+  try {
+    return dictionaryFromBus(options);
+  } catch (const UnsuitableType& unsuitable) {
+    throw BusFailure(BusFailureKind::invalidArguments, unsuitable.what());
   }
 }
 
@@ -103,6 +112,7 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
         _connection(std::move(connection)),
         _service(service),
         _loop(*_connection),
+        _notifications(*_connection),
         _requests(*_connection, [this](std::uint64_t identifier) { _service.close(identifier); }) {
     _connection->addMatch(
         "type='signal',sender='org.freedesktop.DBus',interface='org.freedesktop.DBus',member='NameOwnerChanged',arg2=''",
@@ -114,13 +124,14 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
   ~Implementation() { unregisterAdaptor(); }
 
   BusLoop& loop() { return _loop; }
+  BusNotifications& notifications() { return _notifications; }
 
  private:
   void RequestAccess(AccessResult&& result, std::string accountType, BusDictionary accessOptions,
                      BusDictionary options) override {
     startRequest(std::move(result), options,
                  [this, accountType, accessOptions](const BusCaller& caller, PendingRequest& request) {
-                   return _service.requestAccess(caller, accountType, dictionaryFromBus(accessOptions), request);
+                   return _service.requestAccess(caller, accountType, requestedOptions(accessOptions), request);
                  });
   }
 
@@ -186,6 +197,21 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
 
   void ListClients(sdbus::Result<BusRows>&& result, BusDictionary options) override {
     start(std::move(result), options, {}, [this](const BusCaller& caller) { return rowsToBus(_service.listClients(caller)); });
+  }
+
+  void GetPreference(sdbus::Result<BusDictionary>&& result, std::string domain, std::string key, BusDictionary options) override {
+    start(std::move(result), options, {}, [this, domain, key](const BusCaller& caller) {
+      const auto value = _service.preference(caller, domain, key);
+      return value ? dictionaryToBus({{"value", *value}}) : BusDictionary();
+    });
+  }
+
+  void SetPreference(sdbus::Result<>&& result, std::string domain, std::string key, BusDictionary options) override {
+    start(std::move(result), options, {"value"}, [this, domain, key, options](const BusCaller& caller) {
+      const Dictionary given = requestedOptions(options);
+      const Value* value = given.find("value");
+      _service.setPreference(caller, domain, key, value == nullptr ? std::nullopt : std::optional(*value));
+    });
   }
 
   void GetStatus(sdbus::Result<BusDictionary>&& result, BusDictionary options) override {
@@ -283,6 +309,7 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
   std::unique_ptr<sdbus::IConnection> _connection;
   AccountsService& _service;
   BusLoop _loop;
+  BusNotifications _notifications;
   RequestObjects _requests;
   std::mutex _mutex;
   std::map<std::string, BusCaller> _callers;
@@ -297,6 +324,8 @@ BusServer::~BusServer() = default;
 
 void BusServer::run() { _implementation->loop().run(); }
 void BusServer::stop() { _implementation->loop().stop(); }
+
+NotificationBus& BusServer::notifications() { return _implementation->notifications(); }
 
 void BusServer::emitAccountsChanged(const std::string& accountType) { _implementation->emitAccountsChanged(accountType); }
 

@@ -10,6 +10,7 @@
 #include <string>
 
 #include "Host/Bus/AccountsService.h"
+#include "Platform/NotificationBus.h"
 
 namespace palisade {
 
@@ -23,6 +24,9 @@ class BusServer {
 
   void run();
   void stop();
+
+  /// The notification bus on the same connection.
+  NotificationBus& notifications();
 
   void emitAccountsChanged(const std::string& accountType);
   void emitGrantsChanged(const std::string& accountType, const std::string& client);

@@ -17,8 +17,8 @@
 #include <set>
 #include <string>
 
+#include "DBus/BusValue.h"
 #include "Host/Bus/AccountsService.h"
-#include "Host/Bus/BusValue.h"
 
 namespace palisade {
 

@@ -1,11 +1,9 @@
-#include "Host/Bus/BusValue.h"
+#include "DBus/BusValue.h"
 
 #include <sdbus-c++/sdbus-c++.h>
 
 #include <cstdint>
 #include <vector>
-
-#include "Host/Bus/AccountsService.h"
 
 namespace palisade {
 namespace {
@@ -90,8 +88,7 @@ Value valueFromBus(const sdbus::Variant& variant, const std::string& name) {
     for (const auto& element : variant.get<std::vector<sdbus::Variant>>()) array.push_back(valueFromBus(element, name));
     return array;
   }
-  throw BusFailure(BusFailureKind::invalidArguments,
-                   "'" + name + "' has the type '" + variant.peekValueType() +
+  throw UnsuitableType("'" + name + "' has the type '" + variant.peekValueType() +
                        "', which has no meaning here. Use strings, numbers, booleans, and arrays or dictionaries of variants.");
 }
 

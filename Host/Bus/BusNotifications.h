@@ -1,0 +1,26 @@
+#pragma once
+
+/// The notification bus on D-Bus: one signal a posted notification (DBus/com.veltran.Notify1.xml). See `NotificationBus`.
+///
+/// The bus itself filters by name, so a process is woken only for what it registered for.
+/// Threads: `registerHandler` from any thread; signals arrive on the thread that reads the connection and are handed to the
+/// asked queue. Ownership: borrows the connection, which outlives every registration that is not kept for ever.
+
+#include <sdbus-c++/IConnection.h>
+
+#include "Platform/NotificationBus.h"
+
+namespace palisade {
+
+class BusNotifications final : public NotificationBus {
+ public:
+  explicit BusNotifications(sdbus::IConnection& connection) : _connection(connection) {}
+
+  std::shared_ptr<NotificationRegistration> registerHandler(std::string_view name, std::shared_ptr<SerialQueue> queue,
+                                                            std::function<void()> handler) override;
+
+ private:
+  sdbus::IConnection& _connection;
+};
+
+}  // namespace palisade
