@@ -66,6 +66,7 @@ void CurlTransfer::set(CURLoption option, Setting setting) {
 }
 
 void CurlTransfer::setRequest() {
+  if (_request.url.empty()) throw std::runtime_error("No server is configured: its address is missing.");
   set(CURLOPT_URL, _request.url.c_str());
   set(CURLOPT_USERAGENT, "palisade");
   set(CURLOPT_HTTP_VERSION, long{CURL_HTTP_VERSION_1_1});

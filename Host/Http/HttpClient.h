@@ -74,6 +74,9 @@ class HttpTransfer {
   /// Cancels; does not wait for the handler.
   ~HttpTransfer();
 
+  /// Lets the request go on without an owner: it ends with its answer, or with the client.
+  void letGo() { _thread.reset(); }
+
  private:
   std::weak_ptr<TransferThread> _thread;
   std::uint64_t _number;
