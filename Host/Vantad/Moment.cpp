@@ -1,0 +1,32 @@
+#include "Host/Vantad/Moment.h"
+
+#include <ctime>
+#include <fstream>
+
+namespace palisade {
+namespace {
+
+std::string readBoot() {
+  std::string boot;
+  std::getline(std::ifstream("/proc/sys/kernel/random/boot_id"), boot);
+  return boot;
+}
+
+}  // namespace
+
+Moment presentMoment() {
+  static const std::string boot = readBoot();
+  timespec uptime = {};
+  clock_gettime(CLOCK_BOOTTIME, &uptime);
+  return {.date = std::chrono::floor<std::chrono::seconds>(std::chrono::system_clock::now()),
+          .boot = boot,
+          .uptime = std::chrono::duration_cast<std::chrono::milliseconds>(std::chrono::seconds(uptime.tv_sec) +
+                                                                          std::chrono::nanoseconds(uptime.tv_nsec))};
+}
+
+std::optional<std::chrono::milliseconds> elapsed(const Moment& from, const Moment& until) {
+  if (from.boot.empty() || from.boot != until.boot || from.uptime > until.uptime) return std::nullopt;
+  return until.uptime - from.uptime;
+}
+
+}  // namespace palisade
