@@ -112,7 +112,7 @@ TEST_P(AnUnsendableRequest, IsAnErrorAndNothingIsSent) {
 
 INSTANTIATE_TEST_SUITE_P(
     Table, AnUnsendableRequest,
-    testing::Values(Unsendable{"noAddress", {.url = ""}, HttpErrorInvalidRequest},
+    testing::Values(Unsendable{"noAddress", {.url = ""}, HttpErrorUnavailable},
                     Unsendable{"plainHttp", {.url = "http://SERVER/"}, HttpErrorInvalidRequest},
                     Unsendable{"file", {.url = "file:///etc/passwd"}, HttpErrorInvalidRequest},
                     Unsendable{"anotherProtocol", {.url = "gopher://SERVER/"}, HttpErrorInvalidRequest},
