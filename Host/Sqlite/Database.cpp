@@ -62,7 +62,9 @@ void Database::createStore(const StoreOptions& options) {
   UnfinishedStore unfinished(options.path);
   {
     Database database(unfinished.path(), SQLITE_OPEN_READWRITE, options.busyTimeout);
-    database.makeDurable();
+    // Nobody depends on an unfinished file: it is synced once, before it gets its name.
+    database.execute("make the store", "PRAGMA synchronous=OFF");
+    database.keepLog();
     database.migrate(options);
     // Closing would move the log into the file too, but keeps to itself when it fails.
     database.execute("make the store", "PRAGMA wal_checkpoint(TRUNCATE)");
@@ -74,7 +76,8 @@ std::unique_ptr<Database> Database::openExisting(const StoreOptions& options) {
   requirePrivateFile(options.path);
   std::unique_ptr<Database> database(new Database(options.path, SQLITE_OPEN_READWRITE, options.busyTimeout));
   database->requireKnownStore(options);
-  database->makeDurable();
+  database->keepLog();
+  database->execute(opening, "PRAGMA synchronous=FULL; PRAGMA foreign_keys=ON; PRAGMA secure_delete=ON");
   if (database->size() <= greatestSizeToCheck) database->check();
   database->migrate(options);
   return database;
@@ -115,15 +118,12 @@ void Database::requireKnownStore(const StoreOptions& options) {
   if (sqlite3_db_readonly(connection(), "main") == 1) throw failure(SQLITE_READONLY, opening);
 }
 
-void Database::makeDurable() {
-  {
-    Statement setMode(*this, "keep a write-ahead log", "PRAGMA journal_mode=WAL");
-    Statement::Run mode = setMode.run();
-    if (!mode.next() || mode.text(0) != "wal") {
-      throw SqliteError(StoreErrorOther, _path, opening, "its file system cannot keep a write-ahead log");
-    }
+void Database::keepLog() {
+  Statement setMode(*this, "keep a write-ahead log", "PRAGMA journal_mode=WAL");
+  Statement::Run mode = setMode.run();
+  if (!mode.next() || mode.text(0) != "wal") {
+    throw SqliteError(StoreErrorOther, _path, opening, "its file system cannot keep a write-ahead log");
   }
-  execute(opening, "PRAGMA synchronous=FULL; PRAGMA foreign_keys=ON; PRAGMA secure_delete=ON");
 }
 
 void Database::migrate(const StoreOptions& options) {

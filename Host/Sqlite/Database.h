@@ -80,7 +80,7 @@ class Database {
   std::int64_t size();
   std::int64_t pragma(const char* sql);
   void requireKnownStore(const StoreOptions& options);
-  void makeDurable();
+  void keepLog();
   void migrate(const StoreOptions& options);
 
   std::filesystem::path _path;

@@ -35,13 +35,13 @@ void removeFile(const fs::path& path) {
   fs::remove(path, ignored);
 }
 
-// Makes a new name in the folder survive a power cut.
-void syncFolderOf(const fs::path& path) {
-  const int folder = ::open(path.parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-  const bool isSynced = folder >= 0 && ::fsync(folder) == 0;
+// Makes the content of a file, or the names in a folder, survive a power cut.
+void sync(const fs::path& path) {
+  const int file = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+  const bool isSynced = file >= 0 && ::fsync(file) == 0;
   const int errorNumber = errno;
-  if (folder >= 0) ::close(folder);
-  if (!isSynced) throw systemFailure(path, "store the name of the file", errorNumber);
+  if (file >= 0) ::close(file);
+  if (!isSynced) throw systemFailure(path, "make sure that it is on the disk", errorNumber);
 }
 
 std::string now() {
@@ -98,8 +98,9 @@ void UnfinishedStore::remove() const {
 }
 
 void UnfinishedStore::publish() {
+  sync(_path);
   if (::link(_path.c_str(), _store.c_str()) != 0 && errno != EEXIST) throw systemFailure(_store, "make the store", errno);
-  syncFolderOf(_store);
+  sync(_store.parent_path());
 }
 
 fs::path setAside(const fs::path& store) {
@@ -112,7 +113,7 @@ fs::path setAside(const fs::path& store) {
     if (::rename(from.c_str(), to.c_str()) != 0 && errno != ENOENT) throw systemFailure(from, "set the store aside", errno);
   }
   removeFile(indexOf(store));
-  syncFolderOf(store);
+  sync(store.parent_path());
   return aside;
 }
 

@@ -17,7 +17,14 @@
 namespace palisade::disk {
 namespace {
 
-constexpr std::string_view syncedMark = ".synced";
+// The copy is named after the file's number: a file keeps it when it is renamed.
+constexpr std::string_view syncedMark = "synced-";
+
+std::filesystem::path syncedCopyOf(const std::filesystem::path& file, const struct stat& status) {
+  return file.parent_path() / (std::string(syncedMark) + std::to_string(status.st_ino));
+}
+
+bool isSyncedCopy(const std::filesystem::path& file) { return file.filename().string().starts_with(syncedMark); }
 
 struct State {
   char folder[PATH_MAX] = "";
@@ -60,7 +67,7 @@ void keepSyncedCopy(int file) {
   struct stat status {};
   if (name.empty() || ::fstat(file, &status) != 0 || !S_ISREG(status.st_mode)) return;
   const int source = ::open(name.c_str(), O_RDONLY | O_CLOEXEC);
-  const int copy = ::open((name + std::string(syncedMark)).c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
+  const int copy = ::open(syncedCopyOf(name, status).c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
   std::vector<char> buffer(1 << 16);
   for (ssize_t size = 0; (size = ::read(source, buffer.data(), buffer.size())) > 0;) {
     ::syscall(SYS_write, copy, buffer.data(), static_cast<std::size_t>(size));
@@ -93,18 +100,19 @@ void cutPower(const std::filesystem::path& folder) {
   std::vector<std::filesystem::path> files;
   for (const auto& entry : std::filesystem::directory_iterator(folder)) files.push_back(entry.path());
   for (const auto& file : files) {
-    if (file.string().ends_with(syncedMark)) continue;
-    const std::filesystem::path synced = file.string() + std::string(syncedMark);
+    if (isSyncedCopy(file)) continue;
+    struct stat status {};
+    const bool wasSynced = ::stat(file.c_str(), &status) == 0 && std::filesystem::exists(syncedCopyOf(file, status));
     if (file.string().ends_with("-shm")) {
       std::filesystem::remove(file);
-    } else if (std::filesystem::exists(synced)) {
-      std::filesystem::rename(synced, file);
+    } else if (wasSynced) {
+      std::filesystem::rename(syncedCopyOf(file, status), file);
     } else {
       std::filesystem::resize_file(file, 0);
     }
   }
   for (const auto& file : files) {
-    if (file.string().ends_with(syncedMark)) std::filesystem::remove(file);
+    if (isSyncedCopy(file)) std::filesystem::remove(file);
   }
 }
 

@@ -26,7 +26,7 @@ void order(Fault fault, std::size_t call, int errorNumber = 0);
 /// Takes the order back; answers whether it was carried out.
 bool withdraw();
 
-/// While it is on, each file keeps beside it, under `NAME.synced`, what of it a power cut leaves at least.
+/// While it is on, there is a copy beside each file of what a power cut leaves of it at least.
 void keepSyncedCopies(bool isOn);
 
 /// What a power cut leaves at least of the folder's files: what was synced. Names of files count as synced.

@@ -23,7 +23,7 @@ struct Failure {
 
 void PrintTo(const Failure& failure, std::ostream* stream) { *stream << failure.name; }
 
-class AFailingDisk : public AccountStoreFixture, public testing::WithParamInterface<Failure> {
+class AFailingDisk : InMemory, public AccountStoreFixture, public testing::WithParamInterface<Failure> {
  protected:
   AFailingDisk() { disk::watch(folder.path()); }
   ~AFailingDisk() override { disk::withdraw(); }
