@@ -30,6 +30,9 @@ enum JsonErrorCode : int {
   JsonErrorNumberOutOfRange = 8,  ///< a number that no finite double comes near, such as 1e400
 };
 
+/// Whether an escaped U+0000 may stand in a string. Text that goes on to a terminal, a log or a C library must not hold one.
+enum class NullCharacters { refused, accepted };
+
 /// The parser that the daemon hands to its plug-ins.
 ///
 /// Members keep their order. Whole numbers are kept exactly from -2^63 to 2^64-1 and become the nearest double beyond that;
@@ -40,12 +43,13 @@ class NlohmannJsonParser final : public JsonParser {
   static constexpr std::size_t greatestDepth = 512;
 
   /// Accepts arrays and objects nested `maximumDepth` deep, at most `greatestDepth`. With 0 only a bare value is accepted.
-  explicit NlohmannJsonParser(std::size_t maximumDepth = 32);
+  explicit NlohmannJsonParser(std::size_t maximumDepth = 32, NullCharacters nullCharacters = NullCharacters::refused);
 
   JsonParseResult parse(std::string_view data, JsonFragments fragments) const override;
 
  private:
   std::size_t _maximumDepth;
+  NullCharacters _nullCharacters;
 };
 
 /// The value as compact JSON on one line. Bytes that are not UTF-8 become U+FFFD, numbers that are not finite become null. What

@@ -83,7 +83,9 @@ std::string_view reasonForMessage(std::string_view message) {
 // Receives the library's events. Every operation answers whether to go on; after false, `problem` says why not.
 class ValueBuilder {
  public:
-  explicit ValueBuilder(std::size_t maximumDepth) : _maximumDepth(maximumDepth) {}
+  ValueBuilder(std::size_t maximumDepth, NullCharacters nullCharacters)
+      : _maximumDepth(maximumDepth),
+        _nullCharacters(nullCharacters) {}
 
   // NOLINTBEGIN(readability-identifier-naming): the library's names
   bool null() { return add(nullptr); }
@@ -140,7 +142,8 @@ class ValueBuilder {
   }
 
   bool isFreeOfNull(std::string_view text) {
-    return text.find('\0') == std::string_view::npos || fail(JsonErrorNullCharacter, "U+0000 is not accepted in a string");
+    return _nullCharacters == NullCharacters::accepted || text.find('\0') == std::string_view::npos ||
+           fail(JsonErrorNullCharacter, "U+0000 is not accepted in a string");
   }
 
   bool add(Value value) {
@@ -167,6 +170,7 @@ class ValueBuilder {
   }
 
   std::size_t _maximumDepth;
+  NullCharacters _nullCharacters;
   std::vector<Level> _open;
   std::optional<Value> _value;
   std::optional<Problem> _problem;
@@ -183,7 +187,9 @@ JsonParseResult failure(std::string_view text, std::size_t position, const Probl
 
 }  // namespace
 
-NlohmannJsonParser::NlohmannJsonParser(std::size_t maximumDepth) : _maximumDepth(std::min(maximumDepth, greatestDepth)) {}
+NlohmannJsonParser::NlohmannJsonParser(std::size_t maximumDepth, NullCharacters nullCharacters)
+    : _maximumDepth(std::min(maximumDepth, greatestDepth)),
+      _nullCharacters(nullCharacters) {}
 
 JsonParseResult NlohmannJsonParser::parse(std::string_view data, JsonFragments fragments) const {
   const std::string_view text = data.starts_with(byteOrderMark) ? data.substr(byteOrderMark.size()) : data;
@@ -198,7 +204,7 @@ JsonParseResult NlohmannJsonParser::parse(std::string_view data, JsonFragments f
 
   const char* reached = text.data();
   const char* const end = text.data() + text.size();
-  ValueBuilder builder(_maximumDepth);
+  ValueBuilder builder(_maximumDepth, _nullCharacters);
   if (!nlohmann::json::sax_parse(TrackingIterator(text.data(), reached), TrackingIterator(end, reached), &builder)) {
     const std::size_t bytesRead = builder.errorPosition().value_or(static_cast<std::size_t>(reached - text.data()));
     return failure(text, bytesRead - std::min<std::size_t>(bytesRead, 1), *builder.problem());

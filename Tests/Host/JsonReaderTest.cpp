@@ -24,6 +24,15 @@ int codeOf(const JsonParseResult& result) { return result.error ? result.error->
 
 JsonParseResult parse(std::string_view text) { return NlohmannJsonParser().parse(text, JsonFragments::allowed); }
 
+TEST(AParserThatAcceptsNullCharacters, KeepsThemInStringsAndNames) {
+  const NlohmannJsonParser parser(32, NullCharacters::accepted);
+  const auto parsed = parser.parse(R"({"a\u0000b": "\u0000"})", JsonFragments::allowed);
+  ASSERT_TRUE(parsed.value);
+  const Value* entry = parsed.value->dictionary()->find(std::string_view("a\0b", 3));
+  ASSERT_NE(entry, nullptr);
+  EXPECT_EQ(*entry, Value(std::string(1, '\0')));
+}
+
 }  // namespace
 
 TEST(TheJsonParser, AcceptsEveryKindOfValue) {
