@@ -1,34 +1,14 @@
 #include "Testing/FakePlatform.h"
 
-#include <chrono>
 #include <list>
 #include <utility>
 
-#include "Testing/ThreadsAtRest.h"
+#include "Testing/Settling.h"
 #include "Testing/TraceValue.h"
-#include "Testing/Worker.h"
 
 namespace palisade {
-namespace {
-
-// Threads that ran before the first platform was made are none of the platforms' business.
-const ThreadsAtRest& threads() {
-  static const ThreadsAtRest threads;
-  return threads;
-}
-
-// How often the kernel is asked while work is under way; the end of the work itself wakes the asking thread at once.
-constexpr std::chrono::microseconds lookInterval{50};
-
-void waitUntilAtRest(Worker& worker) {
-  while (!threads().now()) worker.joinWithin(lookInterval);
-  worker.joinWithin(std::chrono::microseconds::zero());
-}
-
-}  // namespace
 
 FakePlatform& FakePlatform::create(std::shared_ptr<const JsonParser> parser, std::shared_ptr<const StringTable> strings) {
-  threads();
   static std::mutex mutex;
   static auto& platforms = *new std::list<std::unique_ptr<FakePlatform>>;
   const std::lock_guard lock(mutex);
@@ -80,14 +60,10 @@ std::vector<CompletionCall> FakePlatform::completions() const {
 OperationEnd FakePlatform::run(std::function<void()> operation) {
   static std::mutex oneAtATime;
   const std::lock_guard lock(oneAtATime);
-  Worker daemon(ThreadLabel::daemon, std::move(operation));
-  waitUntilAtRest(daemon);
-  while (auto answer = deliveries.takeNext()) {
-    Worker request(ThreadLabel::request, *std::exchange(answer, std::nullopt));
-    waitUntilAtRest(request);
-  }
-  if (daemon.hasFinished()) return OperationEnd::returned;
-  return alert.keepsWaiting(daemon.id()) ? OperationEnd::waitsForAlert : OperationEnd::waitsForSemaphore;
+  const auto daemon = runUntilAtRest(ThreadLabel::daemon, std::move(operation));
+  while (auto answer = deliveries.takeNext()) runUntilAtRest(ThreadLabel::request, *std::move(answer));
+  if (daemon->hasFinished()) return OperationEnd::returned;
+  return alert.keepsWaiting(daemon->id()) ? OperationEnd::waitsForAlert : OperationEnd::waitsForSemaphore;
 }
 
 }  // namespace palisade

@@ -1,5 +1,6 @@
 #include "Testing/FakeSerialQueue.h"
 
+#include <atomic>
 #include <future>
 #include <utility>
 
@@ -7,6 +8,9 @@ namespace palisade {
 namespace {
 
 thread_local const FakeSerialQueue* currentQueue = nullptr;
+
+std::atomic<std::uint64_t> givenWork = 0;
+std::atomic<std::uint64_t> doneWork = 0;
 
 }  // namespace
 
@@ -22,6 +26,12 @@ FakeSerialQueue::~FakeSerialQueue() {
   }
   _changed.notify_all();
   _thread.join();
+}
+
+FakeSerialQueue::Work FakeSerialQueue::workInProcess() {
+  // In this order, work that is given and done between the two looks makes a difference instead of an accidental balance.
+  const std::uint64_t done = doneWork;
+  return {.given = givenWork, .done = done};
 }
 
 std::optional<std::string> FakeSerialQueue::labelOfCurrent() {
@@ -55,6 +65,7 @@ void FakeSerialQueue::drain() {
 }
 
 void FakeSerialQueue::push(std::function<void()> work) {
+  ++givenWork;
   {
     const std::lock_guard lock(_mutex);
     _work.push_back(std::move(work));
@@ -78,6 +89,7 @@ void FakeSerialQueue::run() {
     lock.lock();
     _isWorking = false;
     _changed.notify_all();
+    ++doneWork;
   }
 }
 

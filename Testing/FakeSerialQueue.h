@@ -6,6 +6,7 @@
 /// asynchronous work ends the process, as it would end the daemon.
 
 #include <condition_variable>
+#include <cstdint>
 #include <deque>
 #include <functional>
 #include <memory>
@@ -25,6 +26,15 @@ class FakeSerialQueue final : public SerialQueue {
  public:
   FakeSerialQueue(Instruments instruments, std::string_view label);
   ~FakeSerialQueue() override;
+
+  /// Pieces of work that were given to the queues of this process, and those of them that have been done.
+  struct Work {
+    std::uint64_t given = 0;
+    std::uint64_t done = 0;
+
+    bool isDone() const { return given == done; }
+  };
+  static Work workInProcess();
 
   /// The label of the queue whose work the calling thread carries out, or none.
   static std::optional<std::string> labelOfCurrent();
