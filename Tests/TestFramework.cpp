@@ -1,0 +1,1 @@
+// Has no code: the target that owns GoogleTest's precompiled header needs a source.
