@@ -4,7 +4,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <filesystem>
 #include <memory>
 #include <optional>
@@ -12,18 +11,11 @@
 #include <vector>
 
 #include "Host/Accounts/SqliteAccountStore.h"
+#include "Tests/Host/Store/InMemory.h"
 #include "Tests/Host/Store/Records.h"
 #include "Tests/Host/TemporaryFolder.h"
 
 namespace palisade {
-
-/// Put before the fixture where thousands of stores are made and syncing them is not what is tested: keeps them in memory.
-class InMemory {
- protected:
-  InMemory() {
-    if (std::filesystem::is_directory("/dev/shm")) setenv("TMPDIR", "/dev/shm", 1);
-  }
-};
 
 class AccountStoreFixture : public testing::Test {
  protected:
