@@ -5,7 +5,9 @@
 
 #include <cstdlib>
 #include <fstream>
+#include <iterator>
 #include <optional>
+#include <random>
 #include <string>
 #include <thread>
 #include <vector>
@@ -135,6 +137,25 @@ TEST_F(AStringTable, PassesOverADamagedCatalogue) {
   }
   writeCatalogue(folder.path(), "de", whole);
   EXPECT_EQ(textOf(GettextStringTable(folder.path(), "de"), "GREETING"), "Hallo");
+}
+
+TEST_F(AStringTable, LosesNoMoreThanTextsToDamage) {
+  const TemporaryFolder folder;
+  std::ifstream compiled(std::filesystem::path(LANGUAGES_FOLDER) / "de/LC_MESSAGES/Localizable.mo", std::ios::binary);
+  const std::string whole{std::istreambuf_iterator<char>(compiled), std::istreambuf_iterator<char>()};
+  ASSERT_FALSE(whole.empty());
+  std::mt19937 random(20251121);
+  int kept = 0;
+  for (int round = 0; round < 1'000; ++round) {
+    std::string bytes = whole;
+    for (unsigned change = random() % 3 + 1; change > 0; --change) bytes[random() % bytes.size()] = static_cast<char>(random());
+    writeCatalogue(folder.path(), "de", bytes);
+    const GettextStringTable table(folder.path(), "de");
+    textOf(table, "GREETING");
+    if (textOf(table, "FAREWELL") == "Auf Wiedersehen") ++kept;
+  }
+  EXPECT_GT(kept, 100);
+  EXPECT_LT(kept, 900);
 }
 
 TEST_F(AStringTable, AnswersManyThreadsAtOnce) {
