@@ -2,11 +2,17 @@
 
 /// Who is calling: from the bus and the kernel, never from what the caller says.
 ///
-/// A process is pinned with pidfd_open(2), the bus is asked again whose connection it is, and only then /proc is read, in this order:
-/// the Flatpak instance file, the snap's security label or cgroup, the systemd unit, the executable. The first that says something
-/// decides. Client records (one TOML file an application) give the application a bundle ID, a name, and entitlements; entitlements
-/// count only from files that belong to root and that nobody else can write.
-/// Threads: safe from every thread. Ownership: clients are shared. Errors: `IdentityError`; a look-up that fails refuses, and there is
+/// A process is pinned with pidfd_open(2), the bus is asked again whose connection it is, and only then /proc is read, in this
+/// order: the Flatpak instance file, the snap's security label or cgroup, the systemd unit, the executable. The first that says
+/// something decides. Client records (one TOML file an application, see ClientRecord.h) give the application a bundle ID, a
+/// name, and entitlements; entitlements count only from files that belong to root and that nobody else can write.
+///
+/// Without a record, a sandboxed application is known by the ID that its sandbox gives it, and any other program by the path of
+/// its executable alone, without a bundle ID. A script is its interpreter. What tells programs of one user apart holds against
+/// mistakes and against sandboxed applications; a program outside every sandbox can preload a library into another one, ask for
+/// a unit of any name, or build a sandbox that looks like any application's. Such programs of one user trust each other.
+/// Threads: safe from every thread, as long as nobody changes the environment at that moment; names are looked up in the
+/// language that it names. Ownership: clients are shared. Errors: `IdentityError`; a look-up that fails refuses, and there is
 /// no default identity.
 
 #include <sys/types.h>
@@ -14,38 +20,35 @@
 #include <filesystem>
 #include <functional>
 #include <memory>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
+#include "Host/Identity/IdentityError.h"
 #include "Host/Identity/RegisteredClient.h"
 
 namespace palisade {
 
-class IdentityError : public std::runtime_error {
- public:
-  using std::runtime_error::runtime_error;
-};
-
 class ClientRegistry {
  public:
-  /// Records are read from `*.toml` in the folders, the first folder that has a bundle ID wins. A record that cannot be read is left
-  /// out and told in `troubles`.
+  /// Records are read from `*.toml` in the folders, once; the first folder that has a bundle ID wins. A record that cannot be
+  /// read is left out and told in `troubles`.
   explicit ClientRegistry(std::vector<std::filesystem::path> folders);
   ~ClientRegistry();
 
   ClientRegistry(const ClientRegistry&) = delete;
   ClientRegistry& operator=(const ClientRegistry&) = delete;
 
-  /// The client behind a process. `processOfConnection` asks the bus again for the process that owns the connection.
+  /// The client behind a process. `processOfConnection` asks the bus again for the process that owns the connection; what it
+  /// throws refuses too.
   std::shared_ptr<const RegisteredClient> identify(pid_t process, const std::function<pid_t()>& processOfConnection) const;
 
-  /// The client that grants are recorded under, or none when no record has that ID any more.
+  /// The client that grants are recorded under, or none when no record has that ID any more. Its class is the weakest by which
+  /// its record lets a caller in.
   std::shared_ptr<const RegisteredClient> clientWithID(const std::string& id) const;
 
   std::vector<std::shared_ptr<const RegisteredClient>> clients() const;
 
-  /// Records that were left out, each with the reason.
+  /// Records that were left out and entitlements that do not count, each with the file and the reason.
   std::vector<std::string> troubles() const;
 
  private:
