@@ -48,11 +48,11 @@ std::optional<Snap> snapOfElement(std::string_view element, bool isFreezer) {
 std::optional<Snap> snapOfLabel(std::string_view label) {
   label = label.substr(0, label.find_first_of(std::string_view("\n\0", 2)));
   if (!label.starts_with(prefix)) return std::nullopt;
-  std::string_view profile = label;
-  const std::string_view mode = profile.ends_with(')') ? profile.substr(profile.rfind('(')) : std::string_view();
-  profile = takeUntil(profile, ' ').substr(prefix.size());
-  const std::string_view name = takeUntil(profile, '.');
-  return snapFrom(name, profile, mode == "(enforce)", label);
+  std::string_view mode = label.substr(prefix.size());
+  std::string_view application = takeUntil(mode, ' ');
+  const std::string_view name = takeUntil(application, '.');
+  const bool isWellFormed = !application.empty() && (mode.empty() || (mode.starts_with('(') && mode.ends_with(')')));
+  return snapFrom(isWellFormed ? name : "", application, mode == "(enforce)", label);
 }
 
 std::optional<Snap> snapOfCgroups(std::string_view cgroups) {
