@@ -19,11 +19,12 @@
 #include "Host/Daemon/Operation.h"
 #include "Host/Identity/ClientRegistry.h"
 #include "Host/Keychain/Keychain.h"
+#include "Host/Preferences/TomlPreferencesStore.h"
 #include "Platform/AccountAccessPlugin.h"
 
 namespace palisade {
 
-class AccountsDaemon final : public AccountsService {
+class AccountOperations final : public AccountsService {
  public:
   /// The plug-in that serves an account type, or null.
   using PluginFinder = std::function<std::shared_ptr<AccountAccessPlugin>(std::string_view accountType)>;
@@ -32,12 +33,13 @@ class AccountsDaemon final : public AccountsService {
     SqliteAccountStore& store;
     Keychain& keychain;
     const ClientRegistry& clients;
+    TomlPreferencesStore& preferences;
     PluginFinder pluginFor;
     std::function<Rows()> revocations;
     std::function<Dictionary()> status;
   };
 
-  explicit AccountsDaemon(Parts parts) : _parts(std::move(parts)), _lanes(longestLane) {}
+  explicit AccountOperations(Parts parts) : _parts(std::move(parts)), _lanes(longestLane) {}
 
   AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType, const Dictionary& accessOptions,
                               PendingRequest& request) override;
@@ -57,6 +59,9 @@ class AccountsDaemon final : public AccountsService {
   Rows history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) override;
   Rows listRevocations(const BusCaller& caller) override;
   Rows listClients(const BusCaller& caller) override;
+  std::optional<Value> preference(const BusCaller& caller, const std::string& domain, const std::string& key) override;
+  void setPreference(const BusCaller& caller, const std::string& domain, const std::string& key,
+                     const std::optional<Value>& value) override;
   Dictionary status(const BusCaller& caller) override;
 
   void close(std::uint64_t requestIdentifier) override;

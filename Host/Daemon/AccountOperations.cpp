@@ -1,4 +1,4 @@
-#include "Host/Daemon/AccountsDaemon.h"
+#include "Host/Daemon/AccountOperations.h"
 
 #include <algorithm>
 #include <future>
@@ -6,6 +6,7 @@
 #include "Host/Accounts/StoredAccount.h"
 #include "Host/Bus/BusLoop.h"
 #include "Host/Daemon/OperationStore.h"
+#include "Host/Preferences/TomlFile.h"
 #include "Platform/AccountConstants.h"
 #include "Platform/AccountType.h"
 
@@ -42,6 +43,15 @@ Dictionary rowOf(const StoredAuthorization& stored) {
           {"changed", unixTime(stored.updatedAt)}};
 }
 
+template <typename Call>
+auto preferenceCall(const Call& call) {
+  try {
+    return call();
+  } catch (const TomlError& error) {
+    throw BusFailure(BusFailureKind::invalidArguments, error.what());
+  }
+}
+
 /// Runs a piece of work when the scope ends.
 template <typename Work>
 class AtEnd {
@@ -57,8 +67,8 @@ class AtEnd {
 
 }  // namespace
 
-AccessOutcome AccountsDaemon::requestAccess(const BusCaller& caller, const std::string& accountType,
-                                            const Dictionary& accessOptions, PendingRequest& request) {
+AccessOutcome AccountOperations::requestAccess(const BusCaller& caller, const std::string& accountType,
+                                               const Dictionary& accessOptions, PendingRequest& request) {
   const auto client = clientOf(caller);
   const auto options = std::make_shared<const Dictionary>(accessOptions);
   return carryOut(caller, client, accountType, request,
@@ -67,8 +77,8 @@ AccessOutcome AccountsDaemon::requestAccess(const BusCaller& caller, const std::
                   });
 }
 
-AccessOutcome AccountsDaemon::authorize(const BusCaller& caller, const std::string& accountType, const std::string& clientID,
-                                        PendingRequest& request) {
+AccessOutcome AccountOperations::authorize(const BusCaller& caller, const std::string& accountType, const std::string& clientID,
+                                           PendingRequest& request) {
   refuseUnlessManager(caller);
   const auto client = registeredClient(clientID);
   return carryOut(caller, client, accountType, request,
@@ -80,8 +90,8 @@ AccessOutcome AccountsDaemon::authorize(const BusCaller& caller, const std::stri
                   });
 }
 
-AccessOutcome AccountsDaemon::carryOut(const BusCaller& caller, const std::shared_ptr<const RegisteredClient>& client,
-                                       const std::string& accountType, PendingRequest& request, const PluginCall& call) {
+AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::shared_ptr<const RegisteredClient>& client,
+                                          const std::string& accountType, PendingRequest& request, const PluginCall& call) {
   const auto plugin = pluginFor(accountType);
   const auto operation = std::make_shared<Operation>([&request] {
     request.becomePending();
@@ -122,7 +132,7 @@ AccessOutcome AccountsDaemon::carryOut(const BusCaller& caller, const std::share
   }
 }
 
-std::string AccountsDaemon::credential(const BusCaller& caller, const std::string& accountType) {
+std::string AccountOperations::credential(const BusCaller& caller, const std::string& accountType) {
   const auto client = clientOf(caller);
   pluginFor(accountType);
   const auto record = _parts.store.authorizationForClient(client, AccountType(accountType));
@@ -142,7 +152,7 @@ std::string AccountsDaemon::credential(const BusCaller& caller, const std::strin
   throw BusFailure(BusFailureKind::notGranted, "The grant of " + client->description() + " carries no token. Ask again.");
 }
 
-Rows AccountsDaemon::listAccounts(const BusCaller& caller, const std::string& accountType) {
+Rows AccountOperations::listAccounts(const BusCaller& caller, const std::string& accountType) {
   refuseUnlessManager(caller);
   Rows rows;
   for (const AccountRecord& account : _parts.store.accounts()) {
@@ -155,8 +165,8 @@ Rows AccountsDaemon::listAccounts(const BusCaller& caller, const std::string& ac
   return rows;
 }
 
-std::string AccountsDaemon::addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
-                                       std::string token) {
+std::string AccountOperations::addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
+                                          std::string token) {
   refuseUnlessManager(caller);
   pluginFor(accountType);
   while (token.ends_with('\n') || token.ends_with('\r')) token.pop_back();
@@ -175,7 +185,7 @@ std::string AccountsDaemon::addAccount(const BusCaller& caller, const std::strin
   return record.id;
 }
 
-void AccountsDaemon::removeAccount(const BusCaller& caller, const std::string& id) {
+void AccountOperations::removeAccount(const BusCaller& caller, const std::string& id) {
   refuseUnlessManager(caller);
   const auto accounts = _parts.store.accounts();
   const auto found = std::ranges::find(accounts, id, &AccountRecord::id);
@@ -194,14 +204,14 @@ void AccountsDaemon::removeAccount(const BusCaller& caller, const std::string& i
   _parts.store.removeAccount(id);
 }
 
-Rows AccountsDaemon::listGrants(const BusCaller& caller, const std::string& accountType) {
+Rows AccountOperations::listGrants(const BusCaller& caller, const std::string& accountType) {
   refuseUnlessManager(caller);
   Rows rows;
   for (const StoredAuthorization& stored : _parts.store.storedAuthorizations(accountType)) rows.push_back(rowOf(stored));
   return rows;
 }
 
-void AccountsDaemon::revoke(const BusCaller& caller, const std::string& accountType, const std::string& clientID) {
+void AccountOperations::revoke(const BusCaller& caller, const std::string& accountType, const std::string& clientID) {
   refuseUnlessManager(caller);
   const auto stored = _parts.store.storedAuthorizations(accountType);
   const auto found = std::ranges::find(stored, clientID, &StoredAuthorization::clientID);
@@ -219,7 +229,7 @@ void AccountsDaemon::revoke(const BusCaller& caller, const std::string& accountT
   });
 }
 
-void AccountsDaemon::revokeAll(const BusCaller& caller, const std::string& accountType) {
+void AccountOperations::revokeAll(const BusCaller& caller, const std::string& accountType) {
   refuseUnlessManager(caller);
   withdraw([](const Running&) { return true; });
   BusLoop::handOver();
@@ -230,7 +240,7 @@ void AccountsDaemon::revokeAll(const BusCaller& caller, const std::string& accou
 }
 
 // A revocation says that it was handled, or why it was not.
-void AccountsDaemon::manage(const std::string& accountType, const PluginCall& call) {
+void AccountOperations::manage(const std::string& accountType, const PluginCall& call) {
   const auto plugin = pluginFor(accountType);
   const auto operation = std::make_shared<Operation>(nullptr);
   operation->userHasAnswered();
@@ -247,7 +257,7 @@ void AccountsDaemon::manage(const std::string& accountType, const PluginCall& ca
   }
 }
 
-Rows AccountsDaemon::history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) {
+Rows AccountOperations::history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) {
   refuseUnlessManager(caller);
   Rows rows;
   for (const HistoryEntry& entry : _parts.store.history({.limit = limit, .bundleID = client})) {
@@ -261,12 +271,12 @@ Rows AccountsDaemon::history(const BusCaller& caller, std::uint32_t limit, const
   return rows;
 }
 
-Rows AccountsDaemon::listRevocations(const BusCaller& caller) {
+Rows AccountOperations::listRevocations(const BusCaller& caller) {
   refuseUnlessManager(caller);
   return _parts.revocations();
 }
 
-Rows AccountsDaemon::listClients(const BusCaller& caller) {
+Rows AccountOperations::listClients(const BusCaller& caller) {
   refuseUnlessManager(caller);
   Rows rows;
   for (const auto& client : _parts.clients.clients()) {
@@ -279,16 +289,30 @@ Rows AccountsDaemon::listClients(const BusCaller& caller) {
   return rows;
 }
 
-Dictionary AccountsDaemon::status(const BusCaller& caller) {
+std::optional<Value> AccountOperations::preference(const BusCaller& caller, const std::string& domain, const std::string& key) {
+  refuseUnlessManager(caller);
+  return preferenceCall([&] {
+    return _parts.preferences.copyValue(key, domain, PreferencesUser::current, PreferencesHost::any);
+  });
+}
+
+void AccountOperations::setPreference(const BusCaller& caller, const std::string& domain, const std::string& key,
+                                      const std::optional<Value>& value) {
+  refuseUnlessManager(caller);
+  BusLoop::handOver();
+  preferenceCall([&] { _parts.preferences.set(domain, key, value); });
+}
+
+Dictionary AccountOperations::status(const BusCaller& caller) {
   refuseUnlessManager(caller);
   return _parts.status();
 }
 
-void AccountsDaemon::close(std::uint64_t requestIdentifier) {
+void AccountOperations::close(std::uint64_t requestIdentifier) {
   withdraw([&](const Running& running) { return running.request == requestIdentifier; });
 }
 
-void AccountsDaemon::callerLeft(const std::string& uniqueName) {
+void AccountOperations::callerLeft(const std::string& uniqueName) {
   {
     const std::lock_guard lock(_mutex);
     _clientsByConnection.erase(uniqueName);
@@ -296,11 +320,11 @@ void AccountsDaemon::callerLeft(const std::string& uniqueName) {
   withdraw([&](const Running& running) { return running.caller == uniqueName; });
 }
 
-void AccountsDaemon::withdrawAll() {
+void AccountOperations::withdrawAll() {
   withdraw([](const Running&) { return true; });
 }
 
-void AccountsDaemon::withdraw(const Withdrawable& isMeant) {
+void AccountOperations::withdraw(const Withdrawable& isMeant) {
   std::vector<std::shared_ptr<Operation>> meant;
   {
     const std::lock_guard lock(_mutex);
@@ -311,7 +335,7 @@ void AccountsDaemon::withdraw(const Withdrawable& isMeant) {
   for (const auto& operation : meant) operation->withdraw();
 }
 
-std::shared_ptr<const RegisteredClient> AccountsDaemon::clientOf(const BusCaller& caller) {
+std::shared_ptr<const RegisteredClient> AccountOperations::clientOf(const BusCaller& caller) {
   {
     const std::lock_guard lock(_mutex);
     const auto known = _clientsByConnection.find(caller.uniqueName);
@@ -326,13 +350,13 @@ std::shared_ptr<const RegisteredClient> AccountsDaemon::clientOf(const BusCaller
   }
 }
 
-void AccountsDaemon::refuseUnlessManager(const BusCaller& caller) {
+void AccountOperations::refuseUnlessManager(const BusCaller& caller) {
   if (clientOf(caller)->clientClass() == ClientClass::sandboxed) {
     throw BusFailure(BusFailureKind::notPermitted, "A sandboxed application may not manage accounts and grants.");
   }
 }
 
-std::shared_ptr<const RegisteredClient> AccountsDaemon::registeredClient(const std::string& id) const {
+std::shared_ptr<const RegisteredClient> AccountOperations::registeredClient(const std::string& id) const {
   auto client = _parts.clients.clientWithID(id);
   if (client == nullptr) {
     throw BusFailure(BusFailureKind::noSuchClient, "There is no client '" + id + "'. `palisade clients` shows them.");
@@ -340,7 +364,7 @@ std::shared_ptr<const RegisteredClient> AccountsDaemon::registeredClient(const s
   return client;
 }
 
-std::shared_ptr<AccountAccessPlugin> AccountsDaemon::pluginFor(const std::string& accountType) const {
+std::shared_ptr<AccountAccessPlugin> AccountOperations::pluginFor(const std::string& accountType) const {
   auto plugin = _parts.pluginFor(accountType);
   if (plugin == nullptr) {
     throw BusFailure(BusFailureKind::invalidArguments, "No plug-in serves the account type '" + accountType + "'.");

@@ -1,0 +1,201 @@
+#include "Host/Daemon/AccountDaemon.h"
+
+#include <atomic>
+#include <chrono>
+#include <cstdlib>
+
+#include "Host/Accounts/ClientDirectory.h"
+#include "Host/Accounts/SqliteAccountStore.h"
+#include "Host/Alert/TerminalAlert.h"
+#include "Host/Bus/BusServer.h"
+#include "Host/Daemon/AccountOperations.h"
+#include "Host/Daemon/AlertScheduler.h"
+#include "Host/Daemon/CrashRepair.h"
+#include "Host/Daemon/Paths.h"
+#include "Host/Daemon/PluginHost.h"
+#include "Host/Http/HttpClient.h"
+#include "Host/Identity/ClientRegistry.h"
+#include "Host/Json/Json.h"
+#include "Host/Log/JournalLog.h"
+#include "Host/Preferences/TomlFile.h"
+#include "Host/Preferences/TomlPreferencesStore.h"
+#include "Host/Queue/ThreadSerialQueue.h"
+#include "Host/Social/HttpSocialFramework.h"
+#include "Host/Vantad/Outbox.h"
+#include "Platform/AccountConstants.h"
+
+namespace palisade {
+namespace {
+
+constexpr const char* startOperation = "start";
+constexpr std::size_t listedRevocations = 1000;
+
+Date now() { return std::chrono::floor<std::chrono::seconds>(std::chrono::system_clock::now()); }
+
+std::optional<std::filesystem::path> credentialsFolder() {
+  const char* folder = std::getenv("CREDENTIALS_DIRECTORY");
+  return folder == nullptr ? std::nullopt : std::optional<std::filesystem::path>(folder);
+}
+
+ServerConfiguration serverConfiguration() {
+  const auto file = configurationFolder() / "server.toml";
+  const auto table = readTomlFile(file);
+  if (!table) return {};
+  try {
+    return ServerConfiguration(*table);
+  } catch (const ServerConfigurationError& error) {
+    throw std::runtime_error(file.string() + ": " + error.what());
+  }
+}
+
+/// Tells grants' clients apart for the store.
+class Directory final : public ClientDirectory {
+ public:
+  explicit Directory(const ClientRegistry& clients) : _clients(clients) {}
+
+  std::string idOfClient(const Client& client) const override {
+    const auto* registered = dynamic_cast<const RegisteredClient*>(&client);
+    return registered == nullptr ? client.description() : registered->id();
+  }
+
+  std::shared_ptr<const Client> clientWithID(const std::string& id) const override { return _clients.clientWithID(id); }
+
+ private:
+  const ClientRegistry& _clients;
+};
+
+}  // namespace
+
+// In the order of construction: each part may use what stands above it.
+struct AccountDaemon::Parts {
+  explicit Parts(const DaemonConfiguration& configuration)
+      : clients(clientRecordFolders()),
+        directory(clients),
+        store({.path = stateFolder() / "accounts.sqlite", .onChange = [this](const StoreChange& change) { announce(change); }},
+              directory),
+        log(configuration.logLevel, [this](const AccessRequestRecord& record) { store.appendToHistory(record, now()); }),
+        keychain(openKeychain({.choice = configuration.keychain,
+                               .vault = {.path = stateFolder() / "vault.sqlite",
+                                         .keyFile = stateFolder() / "vault.key",
+                                         .credentialsFolder = credentialsFolder()},
+                               .choiceFile = stateFolder() / "keychain"})),
+        outbox({.path = stateFolder() / "outbox.sqlite"}),
+        server(serverConfiguration()),
+        http(server.httpOptions()),
+        social(http, outbox, FacebookServer(server), [this] { return firstFacebookAccount(); }),
+        preferences(configurationFolder() / "preferences"),
+        terminal(configuration.terminal.value_or("")),
+        alert(terminal, TerminalAlert::takeDown),
+        service({.store = store,
+                 .keychain = *keychain,
+                 .clients = clients,
+                 .preferences = preferences,
+                 .pluginFor = [this](std::string_view accountType) { return plugins->pluginFor(accountType); },
+                 .revocations = [this] { return revocations(); },
+                 .status = [this] { return status(); }}),
+        bus(service) {
+    // Only the owner of the bus name may repair: another daemon could be in the middle of a grant.
+    for (const std::string& sentence : repairAfterCrash(store, *keychain, outbox)) tell(sentence);
+    plugins.emplace(configuration.plugins, PlatformServices{.log = &log,
+                                                            .keychain = keychain.get(),
+                                                            .social = &social,
+                                                            .alert = &alert,
+                                                            .preferences = &preferences,
+                                                            .notifications = &bus.notifications(),
+                                                            .queues = &queues,
+                                                            .json = &json});
+    for (const std::string& trouble : plugins->troubles()) tell(trouble);
+    for (const std::string& trouble : clients.troubles()) tell(trouble);
+  }
+
+  void tell(const std::string& sentence) { log.record(startOperation, LogLevel::error, "%@", "sentence", sentence); }
+
+  void announce(const StoreChange& change) {
+    if (!isServing) return;
+    if (change.kind == StoreChange::Kind::accounts) {
+      bus.emitAccountsChanged(change.accountTypeIdentifier);
+    } else {
+      bus.emitGrantsChanged(change.accountTypeIdentifier, change.clientID.value_or(""));
+    }
+  }
+
+  std::optional<std::string> firstFacebookAccount() {
+    for (const AccountRecord& account : store.accounts()) {
+      if (account.accountTypeIdentifier == AccountTypeIdentifierFacebook) return account.id;
+    }
+    return std::nullopt;
+  }
+
+  Rows revocations() {
+    Rows rows;
+    for (const Invalidation& entry : outbox.latest(listedRevocations)) {
+      Dictionary row{{"account", entry.accountID},
+                     {"app_id", entry.appID},
+                     {"state", nameOf(entry.state)},
+                     {"attempts", entry.attempts},
+                     {"requested", entry.requested.date.time_since_epoch().count()}};
+      if (entry.nextAttemptAt) row.set("next_attempt", entry.nextAttemptAt->time_since_epoch().count());
+      if (entry.lastError) row.set("last_error", *entry.lastError);
+      rows.push_back(std::move(row));
+    }
+    return rows;
+  }
+
+  Dictionary status() {
+    Array modules;
+    for (const std::string& module : plugins->modules()) modules.emplace_back(module);
+    Dictionary report{{"plugins", modules},
+                      {"keychain", keychain->description()},
+                      {"alert", terminal.isAvailable() ? "terminal" : "nobody"},
+                      {"server", server.address},
+                      {"store", (stateFolder() / "accounts.sqlite").string()},
+                      {"log", log.destination()},
+                      {"clients", static_cast<std::int64_t>(clients.clients().size())}};
+    if (!plugins->troubles().empty()) report.set("plugins_trouble", plugins->troubles().front());
+    if (modules.empty()) report.set("plugins_trouble", "No plug-in was loaded.");
+    if (!clients.troubles().empty()) report.set("clients_trouble", clients.troubles().front());
+    if (!terminal.isAvailable()) {
+      report.set("alert_trouble",
+                 "Nobody can be asked. Start accountd with --terminal \"$(tty)\", or set terminal in accountd.toml.");
+    }
+    if (server.address.empty()) {
+      report.set("server_trouble", "No server is configured. Write address = \"https://…\" into " +
+                                       (configurationFolder() / "server.toml").string() + ".");
+    }
+    return report;
+  }
+
+  ClientRegistry clients;
+  Directory directory;
+  SqliteAccountStore store;
+  JournalLog log;
+  std::unique_ptr<Keychain> keychain;
+  Outbox outbox;
+  ServerConfiguration server;
+  HttpClient http;
+  HttpSocialFramework social;
+  TomlPreferencesStore preferences;
+  ThreadSerialQueueFactory queues;
+  NlohmannJsonParser json;
+  TerminalAlert terminal;
+  AlertScheduler alert;
+  AccountOperations service;
+  BusServer bus;
+  std::optional<PluginHost> plugins;
+  std::atomic<bool> isServing = false;
+};
+
+AccountDaemon::AccountDaemon(const DaemonConfiguration& configuration) : _parts(std::make_unique<Parts>(configuration)) {}
+AccountDaemon::~AccountDaemon() = default;
+
+void AccountDaemon::run() {
+  _parts->isServing = true;
+  _parts->bus.run();
+}
+
+void AccountDaemon::stop() {
+  _parts->service.withdrawAll();
+  _parts->bus.stop();
+}
+
+}  // namespace palisade

@@ -1,0 +1,79 @@
+#include "Host/Daemon/Configuration.h"
+
+#include <stdexcept>
+#include <string_view>
+
+namespace palisade {
+
+const char* const daemonHelp = R"(Usage: accountd [OPTION...]
+
+Owns a user's accounts and decides, with its plug-ins, which applications may use them. Started by the session bus when it is first
+called; see com.veltran.Accounts1 there, and palisade(1) for people.
+
+  --plugins DIRECTORY   load the plug-ins in this folder
+  --terminal TTY        ask the user on this terminal, such as the one that `tty` prints
+  --keychain CHOICE     automatic, secret-service or vault
+  --log LEVEL           error, notice or debug
+  -h, --help            show this
+  --version             show the version
+
+The same names can stand in accountd.toml in $XDG_CONFIG_HOME/palisade: keychain = "vault"
+The server's address stands in server.toml beside it.
+)";
+
+namespace {
+
+KeychainChoice keychainChoice(std::string_view word) {
+  if (const auto choice = keychainChoiceNamed(word)) return *choice;
+  throw std::runtime_error("There is no keychain '" + std::string(word) + "': it is automatic, secret-service or vault.");
+}
+
+LogLevel logLevel(std::string_view word) {
+  if (word == "error") return LogLevel::error;
+  if (word == "notice") return LogLevel::notice;
+  if (word == "debug") return LogLevel::debug;
+  throw std::runtime_error("There is no log level '" + std::string(word) + "': it is error, notice or debug.");
+}
+
+void apply(std::string_view name, const std::string& value, DaemonConfiguration& configuration) {
+  if (name == "plugins") {
+    configuration.plugins = value;
+  } else if (name == "terminal") {
+    configuration.terminal = value;
+  } else if (name == "keychain") {
+    configuration.keychain = keychainChoice(value);
+  } else if (name == "log") {
+    configuration.logLevel = logLevel(value);
+  } else {
+    throw std::runtime_error("There is no setting '" + std::string(name) + "'.");
+  }
+}
+
+}  // namespace
+
+void applyConfigurationFile(const Dictionary& table, DaemonConfiguration& configuration) {
+  for (const auto& [name, value] : table) {
+    if (value.string() == nullptr) throw std::runtime_error("'" + name + "' is to be a text in quotes.");
+    apply(name, *value.string(), configuration);
+  }
+}
+
+CommandLineRequest applyCommandLine(int argumentCount, char** arguments, DaemonConfiguration& configuration) {
+  for (int index = 1; index < argumentCount; ++index) {
+    const std::string_view argument = arguments[index];
+    if (argument == "-h" || argument == "--help") return CommandLineRequest::help;
+    if (argument == "--version") return CommandLineRequest::version;
+    if (!argument.starts_with("--")) throw std::runtime_error("'" + std::string(argument) + "' is no option. Try --help.");
+    const std::size_t equals = argument.find('=');
+    if (equals != std::string_view::npos) {
+      apply(argument.substr(2, equals - 2), std::string(argument.substr(equals + 1)), configuration);
+    } else if (index + 1 < argumentCount) {
+      apply(argument.substr(2), arguments[++index], configuration);
+    } else {
+      throw std::runtime_error("The option " + std::string(argument) + " needs a value. Try --help.");
+    }
+  }
+  return CommandLineRequest::serve;
+}
+
+}  // namespace palisade

@@ -1,0 +1,35 @@
+#pragma once
+
+/// What a start of the daemon is told: its command line over accountd.toml over the defaults.
+///
+/// Threads and ownership: a value. Errors: `std::runtime_error` with a sentence that names the option or the key.
+
+#include <filesystem>
+#include <optional>
+#include <string>
+
+#include "Host/Keychain/OpenKeychain.h"
+#include "Platform/Log.h"
+#include "Platform/Value.h"
+
+namespace palisade {
+
+struct DaemonConfiguration {
+  std::filesystem::path plugins;
+  /// The terminal on which to ask; none asks nobody.
+  std::optional<std::string> terminal = std::nullopt;
+  KeychainChoice keychain = KeychainChoice::automatic;
+  LogLevel logLevel = LogLevel::notice;
+};
+
+/// `table` is accountd.toml's: plugins, terminal, keychain (automatic, secret-service, vault), log (error, notice, debug).
+void applyConfigurationFile(const Dictionary& table, DaemonConfiguration& configuration);
+
+/// What the command line asks for.
+enum class CommandLineRequest { serve, help, version };
+
+CommandLineRequest applyCommandLine(int argumentCount, char** arguments, DaemonConfiguration& configuration);
+
+extern const char* const daemonHelp;
+
+}  // namespace palisade

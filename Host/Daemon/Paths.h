@@ -1,0 +1,21 @@
+#pragma once
+
+/// Where the daemons keep their files, as the XDG base directories have it. Written once, here.
+///
+/// Threads: pure functions over the environment. Errors: `std::runtime_error` when the user has no home.
+
+#include <filesystem>
+#include <vector>
+
+namespace palisade {
+
+/// What the daemons write: stores, the vault, the outbox.
+std::filesystem::path stateFolder();
+
+/// What a person writes: server.toml, accountd.toml, preferences/DOMAIN.toml.
+std::filesystem::path configurationFolder();
+
+/// Client records: the administrator's, the user's own, the system's.
+std::vector<std::filesystem::path> clientRecordFolders();
+
+}  // namespace palisade

@@ -1,0 +1,71 @@
+// accountd: the account daemon of one user's session.
+
+#include <pthread.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <exception>
+#include <iostream>
+#include <thread>
+
+#include "Host/Daemon/AccountDaemon.h"
+#include "Host/Daemon/Paths.h"
+#include "Host/Preferences/TomlFile.h"
+#include "Host/Secrets/ProcessSecrecy.h"
+
+namespace {
+
+using palisade::AccountDaemon;
+
+constexpr std::chrono::seconds longestFarewell(1);
+
+// Every thread inherits the blocked signals, so that only the one that waits for them takes them.
+sigset_t blockEndingSignals() {
+  sigset_t signals;
+  sigemptyset(&signals);
+  sigaddset(&signals, SIGTERM);
+  sigaddset(&signals, SIGINT);
+  pthread_sigmask(SIG_BLOCK, &signals, nullptr);
+  return signals;
+}
+
+// Work that waits for a server may take minutes more. What is stored is safe at every moment, so the process does not wait for
+// it.
+void stopWhenSignalled(AccountDaemon& daemon, sigset_t signals) {
+  std::thread([&daemon, signals] {
+    int signal = 0;
+    sigwait(&signals, &signal);
+    daemon.stop();
+    std::this_thread::sleep_for(longestFarewell);
+    _exit(0);
+  }).detach();
+}
+
+int serve(const palisade::DaemonConfiguration& configuration) {
+  const sigset_t signals = blockEndingSignals();
+  AccountDaemon daemon(configuration);
+  stopWhenSignalled(daemon, signals);
+  daemon.run();
+  return 0;
+}
+
+}  // namespace
+
+int main(int argumentCount, char** arguments) {
+  try {
+    palisade::DaemonConfiguration configuration{.plugins = PALISADE_PLUGIN_FOLDER};
+    if (const auto table = palisade::readTomlFile(palisade::configurationFolder() / "accountd.toml")) {
+      palisade::applyConfigurationFile(*table, configuration);
+    }
+    switch (palisade::applyCommandLine(argumentCount, arguments, configuration)) {
+      case palisade::CommandLineRequest::help: std::cout << palisade::daemonHelp; return 0;
+      case palisade::CommandLineRequest::version: std::cout << "accountd " PALISADE_VERSION "\n"; return 0;
+      case palisade::CommandLineRequest::serve: break;
+    }
+    palisade::dropDumpable();
+    return serve(configuration);
+  } catch (const std::exception& failure) {
+    std::cerr << "accountd: " << failure.what() << '\n';
+    return 1;
+  }
+}
