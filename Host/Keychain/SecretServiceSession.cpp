@@ -116,6 +116,10 @@ void SecretServiceSession::openService(GCancellable* cancellable) {
   // When the bus goes, its connection would end the whole process.
   const GHandle<GDBusConnection> bus(g_bus_get_sync(G_BUS_TYPE_SESSION, cancellable, outcome.place()));
   outcome.check();
+  if (g_dbus_connection_is_closed(bus.get()) != FALSE) {
+    throw KeychainError(KeychainErrorUnavailable,
+                        "cannot use the session's Secret Service: the session bus is gone; start again");
+  }
   g_dbus_connection_set_exit_on_close(bus.get(), FALSE);
 
   GHandle<SecretService> service(

@@ -9,6 +9,7 @@
 
 #include "Host/Accounts/StoredAccount.h"
 #include "Platform/AccountCredential.h"
+#include "Platform/Format.h"
 
 namespace palisade {
 
@@ -44,5 +45,7 @@ inline void PrintTo(const CredentialContent& content, std::ostream* stream) {
   *stream << "token " << content.token.value_or("none") << ", refresh token \"" << content.refreshToken << "\", until "
           << content.expiryDate.time_since_epoch().count();
 }
+
+inline void PrintTo(const Error& error, std::ostream* stream) { *stream << describe(error); }
 
 }  // namespace palisade
