@@ -22,6 +22,7 @@ namespace {
 constexpr auto settledAreShown = std::chrono::hours(24 * 90);
 constexpr auto afterAFailure = std::chrono::minutes(1);
 
+// The signals are read from a descriptor, so no thread may have them delivered.
 int openSignals() {
   sigset_t ends;
   sigemptyset(&ends);
@@ -56,6 +57,8 @@ Vantad::~Vantad() {
 
 void Vantad::run() {
   _outbox.removeSettledBefore(presentMoment().date - settledAreShown);
+  _log.record("Vantad::run", LogLevel::notice, "Serving %@ with %d pending invalidations.", "outbox, pending",
+              _options.outbox().string(), _outbox.pending().size());
   while (serve(readConfiguration()) == Reason::configuration) {
     _log.record("Vantad::run", LogLevel::notice, "The configuration has changed.", "");
   }
