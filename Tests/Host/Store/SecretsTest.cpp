@@ -1,0 +1,111 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/prctl.h>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <array>
+#include <cstdio>
+#include <cstring>
+#include <fstream>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "Host/Secrets/ProcessSecrecy.h"
+#include "Host/Secrets/Wipe.h"
+#include "Host/Secrets/WipingMemory.h"
+
+namespace palisade {
+namespace {
+
+using testing::Each;
+
+// What the program prints: how many pieces of a secret that it has given back are in its memory.
+int piecesLeftBy(const std::string& program) {
+  const std::unique_ptr<FILE, int (*)(FILE*)> output(popen(program.c_str(), "r"), pclose);
+  int pieces = -1;
+  EXPECT_EQ(std::fscanf(output.get(), "%d", &pieces), 1) << program;
+  return pieces;
+}
+
+TEST(ASecretThatWasGivenBack, IsNowhereInTheProcess) { EXPECT_EQ(piecesLeftBy(CANARY_PROGRAM), 0); }
+
+TEST(ASecretThatWasGivenBack, IsFoundWithoutTheWipingOperators) { EXPECT_GT(piecesLeftBy(CANARY_PROGRAM_WITHOUT_WIPING), 0); }
+
+TEST(Wiping, LeavesZerosInMemory) {
+  std::array<char, 8> memory{'s', 'e', 'c', 'r', 'e', 't', '!', '!'};
+  wipe(memory.data(), 7);
+  EXPECT_EQ(memory, (std::array<char, 8>{0, 0, 0, 0, 0, 0, 0, '!'}));
+}
+
+TEST(Wiping, EmptiesATextAndWhatItHeldBefore) {
+  std::string text(100, 's');
+  text.resize(3);
+  // The text stays where it is, so its memory may be looked at beyond its end.
+  const std::string_view memory(text.data(), 100);
+  wipe(text);
+  EXPECT_TRUE(text.empty());
+  EXPECT_THAT(memory, Each('\0'));
+}
+
+TEST(WipingMemory, KeepsTheContentOfABlockThatGrowsOrShrinks) {
+  void* block = wipingMalloc(5);
+  std::memcpy(block, "abcd", 5);
+  for (const std::size_t size : {100U, 5U, 5000U, 5U}) {
+    block = wipingRealloc(block, size);
+    EXPECT_STREQ(static_cast<const char*>(block), "abcd") << size;
+  }
+  EXPECT_EQ(wipingRealloc(block, 0), nullptr);
+  wipingFree(nullptr);
+  EXPECT_NE(block = wipingRealloc(nullptr, 1), nullptr);
+  wipingFree(block);
+}
+
+// Runs the check in a child, because it changes the process for good.
+template <typename Check>
+bool holdsInAChild(Check check) {
+  const pid_t child = fork();
+  if (child == 0) _exit(check() ? 0 : 1);
+  int status = -1;
+  waitpid(child, &status, 0);
+  return WIFEXITED(status) && WEXITSTATUS(status) == 0;
+}
+
+TEST(AProcessThatKeepsToItself, CannotBeDumpedOrRead) {
+  EXPECT_TRUE(holdsInAChild([] {
+    dropDumpable();
+    rlimit limit{};
+    getrlimit(RLIMIT_CORE, &limit);
+    return prctl(PR_GET_DUMPABLE) == 0 && limit.rlim_cur == 0 && limit.rlim_max == 0;
+  }));
+}
+
+TEST(AProcessThatKeepsToItself, IsClosedToOthersOfTheSameUser) {
+  if (geteuid() != 0) GTEST_SKIP() << "takes root to become two processes of another user";
+  int ready[2];
+  ASSERT_EQ(pipe(ready), 0);
+  int done[2];
+  ASSERT_EQ(pipe(done), 0);
+  const pid_t keeper = fork();
+  if (keeper == 0) {
+    if (setuid(65534) != 0) _exit(1);
+    dropDumpable();
+    char byte = 'r';
+    if (write(ready[1], &byte, 1) != 1 || read(done[0], &byte, 1) != 1) _exit(1);
+    _exit(0);
+  }
+  char byte = 0;
+  ASSERT_EQ(read(ready[0], &byte, 1), 1);
+  EXPECT_TRUE(holdsInAChild([&] {
+    if (setuid(65534) != 0) return false;
+    return !std::ifstream("/proc/" + std::to_string(keeper) + "/mem") &&
+           !std::ifstream("/proc/" + std::to_string(keeper) + "/environ");
+  }));
+  ASSERT_EQ(write(done[1], &byte, 1), 1);
+  waitpid(keeper, nullptr, 0);
+}
+
+}  // namespace
+}  // namespace palisade
