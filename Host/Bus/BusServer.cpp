@@ -103,13 +103,18 @@ void answer(const Result& result, const Work& work) {
   }
 }
 
+// A base of its own, so that the connection is made before the object that is served on it, and goes away after it.
+struct OwnedConnection {
+  std::unique_ptr<sdbus::IConnection> _connection = sdbus::createSessionBusConnection();
+};
+
 }  // namespace
 
-class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::veltran::Accounts1::Manager_adaptor> {
+class BusServer::Implementation final : private OwnedConnection,
+                                        public sdbus::AdaptorInterfaces<com::veltran::Accounts1::Manager_adaptor> {
  public:
-  Implementation(std::unique_ptr<sdbus::IConnection> connection, AccountsService& service)
-      : AdaptorInterfaces(*connection, objectPath),
-        _connection(std::move(connection)),
+  explicit Implementation(AccountsService& service)
+      : AdaptorInterfaces(*_connection, objectPath),
         _service(service),
         _loop(*_connection),
         _notifications(*_connection),
@@ -118,7 +123,7 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
         "type='signal',sender='org.freedesktop.DBus',interface='org.freedesktop.DBus',member='NameOwnerChanged',arg2=''",
         [this](sdbus::Message& message) { nameVanished(message); }, sdbus::floating_slot);
     registerAdaptor();
-    _connection->requestName(busName);
+    ownName();
   }
 
   ~Implementation() { unregisterAdaptor(); }
@@ -199,7 +204,8 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
     start(std::move(result), options, {}, [this](const BusCaller& caller) { return rowsToBus(_service.listClients(caller)); });
   }
 
-  void GetPreference(sdbus::Result<BusDictionary>&& result, std::string domain, std::string key, BusDictionary options) override {
+  void GetPreference(sdbus::Result<BusDictionary>&& result, std::string domain, std::string key,
+                     BusDictionary options) override {
     start(std::move(result), options, {}, [this, domain, key](const BusCaller& caller) {
       const auto value = _service.preference(caller, domain, key);
       return value ? dictionaryToBus({{"value", *value}}) : BusDictionary();
@@ -219,6 +225,16 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
   }
 
   std::uint32_t version() override { return 1; }
+
+  void ownName() {
+    try {
+      _connection->requestName(busName);
+    } catch (const sdbus::Error& error) {
+      const bool isOwned = error.getName().find("EXIST") != std::string::npos || error.getName().ends_with("FileExists");
+      if (isOwned) throw std::runtime_error("Another account daemon serves this session already.");
+      throw std::runtime_error(std::string("The bus name ") + busName + " cannot be owned: " + error.getMessage() + ".");
+    }
+  }
 
   // Calls are carried out when their message handler has returned: the library holds its lock while one runs. A handler answers
   // only what is wrong with the message itself.
@@ -306,7 +322,6 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
     _service.callerLeft(name);
   }
 
-  std::unique_ptr<sdbus::IConnection> _connection;
   AccountsService& _service;
   BusLoop _loop;
   BusNotifications _notifications;
@@ -317,8 +332,7 @@ class BusServer::Implementation final : public sdbus::AdaptorInterfaces<com::vel
   std::unique_ptr<sdbus::IConnection> _questions;
 };
 
-BusServer::BusServer(AccountsService& service)
-    : _implementation(std::make_unique<Implementation>(sdbus::createSessionBusConnection(), service)) {}
+BusServer::BusServer(AccountsService& service) : _implementation(std::make_unique<Implementation>(service)) {}
 
 BusServer::~BusServer() = default;
 

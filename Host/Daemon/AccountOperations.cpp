@@ -124,7 +124,7 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
 
     if (!operation->isAnsweredByUser() && result.response != AccessResponse::granted) {
       _parts.store.removeAnswersByNobodyForClient(*client);
-      if (operation->isWithdrawn()) result.response = AccessResponse::withdrawn;
+      if (operation->isLeftUnanswered()) result.response = AccessResponse::withdrawn;
     }
     return result;
   } catch (const LaneIsFull& failure) {
@@ -291,9 +291,8 @@ Rows AccountOperations::listClients(const BusCaller& caller) {
 
 std::optional<Value> AccountOperations::preference(const BusCaller& caller, const std::string& domain, const std::string& key) {
   refuseUnlessManager(caller);
-  return preferenceCall([&] {
-    return _parts.preferences.copyValue(key, domain, PreferencesUser::current, PreferencesHost::any);
-  });
+  return preferenceCall(
+      [&] { return _parts.preferences.copyValue(key, domain, PreferencesUser::current, PreferencesHost::any); });
 }
 
 void AccountOperations::setPreference(const BusCaller& caller, const std::string& domain, const std::string& key,

@@ -55,10 +55,11 @@ std::shared_ptr<AlertHandle> AlertScheduler::createAlert(AlertAllocator allocato
 int AlertScheduler::receiveResponse(const std::shared_ptr<AlertHandle>& handle, double timeoutSeconds,
                                     AlertResponse& response) {
   response = AlertResponseNobody;
+  Operation* operation = Operation::current();
+  if (operation != nullptr) operation->alertWentUnanswered();
   const auto place = std::dynamic_pointer_cast<Place>(handle);
   if (place == nullptr) return EINVAL;
 
-  Operation* operation = Operation::current();
   AlertResponse word = AlertResponseNobody;
   int status = 0;
   {

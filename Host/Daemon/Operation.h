@@ -35,12 +35,17 @@ class Operation {
   void userHasAnswered() { _userAnswered.store(true, std::memory_order_release); }
   bool isAnsweredByUser() const { return _userAnswered.load(std::memory_order_acquire); }
 
+  /// An alert of the operation ended without an answer: it was closed or taken down, or there was nobody to ask.
+  void alertWentUnanswered() { _wentUnanswered.store(true, std::memory_order_release); }
+  bool isLeftUnanswered() const { return isWithdrawn() || _wentUnanswered.load(std::memory_order_acquire); }
+
  private:
   friend class OperationScope;
 
   std::function<void()> _beforeFirstWait;
   std::atomic<bool> _isWithdrawn = false;
   std::atomic<bool> _userAnswered = false;
+  std::atomic<bool> _wentUnanswered = false;
   std::mutex _mutex;
   std::shared_ptr<const std::function<void()>> _interrupt;
 };

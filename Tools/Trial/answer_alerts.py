@@ -15,7 +15,7 @@ import tty
 
 ESCAPE_SEQUENCE = re.compile(r"\x1b\[[0-9;]*[A-Za-z]")
 LAST_LINE = "┘"
-KEYS = {"allow": b"\r", "refuse": b"\t\r", "close": b"\x1b"}
+KEYS = {"allow": b"\r", "refuse": b"\t\r", "close": b"\x1b", "nothing": b""}
 
 
 def text_of(dialog: str) -> str:
@@ -27,7 +27,7 @@ def text_of(dialog: str) -> str:
 def main() -> None:
     parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
     parser.add_argument("--answer", choices=KEYS, default="allow", help="what to press (default: allow)")
-    parser.add_argument("--quiet", action="store_true", help="print nothing but the terminal's path")
+    parser.add_argument("--when-asked", metavar="FILE", help="make this file when an alert has been read")
     arguments = parser.parse_args()
 
     screen, terminal = pty.openpty()
@@ -44,8 +44,9 @@ def main() -> None:
             if is_answered and "┌" in dialog and dialog.startswith("\r\n"):
                 is_answered = False
             continue
-        if not arguments.quiet:
-            print(text_of(dialog), f"\n    No terminal here, so this is answered by itself: {arguments.answer}.", sep="\n", flush=True)
+        print(text_of(dialog), f"\n    No terminal here, so this is answered by itself: {arguments.answer}.", sep="\n", flush=True)
+        if arguments.when_asked:
+            open(arguments.when_asked, "a", encoding="utf-8").close()
         os.write(screen, KEYS[arguments.answer])
         dialog, is_answered = "", True
 
