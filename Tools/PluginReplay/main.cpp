@@ -82,7 +82,7 @@ ScenarioResult carryOut(const std::string& text, const AnnounceID& announceID, c
   const auto parsed = parser.parse(text, JsonFragments::allowed);
   if (!parsed.value) {
     announceID(std::nullopt);
-    return malformed(std::nullopt, "the scenario is not JSON: " + parsed.error->description.value_or("it cannot be read"));
+    return malformed(std::nullopt, "the scenario cannot be read: " + parsed.error->description.value_or("it is not JSON"));
   }
   const auto id = scenarioID(*parsed.value);
   announceID(id);
