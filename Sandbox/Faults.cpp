@@ -14,7 +14,7 @@ constexpr FaultKindName kinds[] = {
     {FaultKind::reset, "reset", "resets the connection after --bytes of the answer (0)"},
     {FaultKind::redirect, "redirect", "answers --status (302) with --location"},
     {FaultKind::unavailable, "unavailable", "answers --status (503), with --retry-after if that is given"},
-    {FaultKind::status, "status", "answers --status (500) with the contract's error object"},
+    {FaultKind::status, "status", "answers --status (500)"},
     {FaultKind::huge, "huge", "answers 100 MB in chunks"},
     {FaultKind::bomb, "bomb", "answers 10 MB, compressed to a thousandth, as Content-Encoding"},
     {FaultKind::transferBomb, "transfer-bomb", "the same as Transfer-Encoding"},

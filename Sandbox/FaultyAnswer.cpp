@@ -23,10 +23,6 @@ std::string json(int status, const std::string& body, const std::string& fields 
          body;
 }
 
-std::string errorObject(int status) {
-  return "{\"error\":\"fault\",\"error_msg\":\"The sandbox was told to answer " + std::to_string(status) + ".\"}";
-}
-
 std::string chunk(const std::string& bytes) {
   char size[20];
   std::snprintf(size, sizeof size, "%zx\r\n", bytes.size());
@@ -98,14 +94,6 @@ void answerWithFault(const Fault& fault, const std::string& answer, RawConnectio
       connection.write(answer.substr(0, fault.bytes));
       connection.reset();
       break;
-    case FaultKind::redirect:
-      connection.write(head(fault.status, "Location: " + fault.location + "\r\nContent-Length: 0\r\n"));
-      break;
-    case FaultKind::unavailable:
-      connection.write(json(fault.status, errorObject(fault.status),
-                            fault.retryAfter.empty() ? std::string() : "Retry-After: " + fault.retryAfter + "\r\n"));
-      break;
-    case FaultKind::status: connection.write(json(fault.status, errorObject(fault.status))); break;
     case FaultKind::huge: writeHugeBody(connection); break;
     case FaultKind::bomb: connection.write(json(200, bomb(), "Content-Encoding: gzip\r\n")); break;
     case FaultKind::transferBomb:
@@ -122,6 +110,9 @@ void answerWithFault(const Fault& fault, const std::string& answer, RawConnectio
           head(200, "Content-Type: text/html\r\nContent-Length: " + std::to_string(std::string(page).size()) + "\r\n") + page);
       break;
     case FaultKind::garbage: connection.write("220 sandbox ESMTP\r\n"); break;
+    case FaultKind::redirect:
+    case FaultKind::unavailable:
+    case FaultKind::status: connection.write(answer); break;
   }
 }
 

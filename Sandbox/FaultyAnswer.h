@@ -11,7 +11,7 @@
 
 namespace palisade::sandbox {
 
-/// `answer` is the whole proper answer, head and body.
+/// `answer` is the whole proper answer, head and body; a fault that is a proper answer itself writes just that.
 void answerWithFault(const Fault& fault, const std::string& answer, RawConnection& connection);
 
 }  // namespace palisade::sandbox

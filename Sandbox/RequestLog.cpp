@@ -19,7 +19,8 @@ Value RequestLog::requests() const {
                                   {"fields", Array(request.fields.begin(), request.fields.end())},
                                   {"signed", request.isSigned},
                                   {"port", request.port},
-                                  {"status", request.status}});
+                                  {"status", request.status},
+                                  {"members", Array(request.members.begin(), request.members.end())}});
   }
   return requests;
 }

@@ -23,6 +23,8 @@ struct LoggedRequest {
   /// The client's port, which tells connections apart.
   int port = 0;
   int status = 0;
+  /// The names of the members, if it was answered with an object.
+  std::set<std::string> members = {};
 };
 
 class RequestLog {

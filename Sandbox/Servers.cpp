@@ -51,6 +51,17 @@ void fill(httplib::Response& response, const Answer& answer) {
   if (answer.body) response.set_content(writeJson(*answer.body), jsonType);
 }
 
+// Whether the fault is a proper answer that says no.
+bool isRefusal(FaultKind kind) {
+  return kind == FaultKind::redirect || kind == FaultKind::unavailable || kind == FaultKind::status;
+}
+
+Answer refuse(const Fault& fault, httplib::Response& response) {
+  if (!fault.location.empty()) response.set_header("Location", fault.location);
+  if (!fault.retryAfter.empty()) response.set_header("Retry-After", fault.retryAfter);
+  return errorAnswer(fault.status, "fault", "The sandbox was told to answer " + std::to_string(fault.status) + ".");
+}
+
 std::string wholeAnswer(const Answer& answer) {
   const std::string body = answer.body ? writeJson(*answer.body) : std::string();
   return "HTTP/1.1 " + std::to_string(answer.status) + " Sandbox\r\nContent-Type: " + jsonType +
@@ -118,17 +129,19 @@ class Routes {
     for (const auto& [name, value] : form) logged.fields.insert(name);
 
     const std::optional<Fault> fault = request.ssl == nullptr ? std::nullopt : _faults.take(request.path);
-    // What was not carried out in time was carried out all the same: clients have to bear that.
-    const bool isRefused = fault && (fault->kind == FaultKind::redirect || fault->kind == FaultKind::unavailable ||
-                                     fault->kind == FaultKind::status);
-    const Answer answer = isRefused ? Answer{.status = fault->status} : action(tokenOf(request), form);
+    // A request whose answer goes wrong has been carried out all the same: clients have to bear that.
+    const Answer answer = fault && isRefusal(fault->kind) ? refuse(*fault, response) : action(tokenOf(request), form);
+    fill(response, answer);
+
     logged.status = answer.status;
+    if (answer.body && answer.body->dictionary() != nullptr) {
+      for (const auto& [name, value] : *answer.body->dictionary()) logged.members.insert(name);
+    }
     std::fprintf(stderr, "%s %s %d%s\n", logged.method.c_str(), logged.path.c_str(), logged.status,
                  fault ? " with a fault" : "");
     _log.add(std::move(logged));
 
-    fill(response, answer);
-    if (!fault) return;
+    if (!fault || isRefusal(fault->kind)) return;
     RawConnection connection(*const_cast<SSL*>(request.ssl));
     answerWithFault(*fault, wholeAnswer(answer), connection);
   }
