@@ -208,7 +208,7 @@ TEST(ADirectAuthorization, TakesAnAnswerThatCameOnAnotherThreadBeforeTheWait) {
   scene.addRecord(refused);
   scene.platform.social.authorizationAnswers = {serverGrants({"email"})};
 
-  EXPECT_THAT(scene.perform([&](const AccessCompletion& completion) {
+  EXPECT_THAT(scene.performHere([&](const AccessCompletion& completion) {
     plugin->authorizeAccessToAccountsOfType(scene.facebook, scene.client, scene.store, completion);
   }),
               isGrant());

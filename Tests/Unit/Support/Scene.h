@@ -54,6 +54,12 @@ struct RecordData {
   friend bool operator==(const RecordData&, const RecordData&) = default;
 };
 
+inline void PrintTo(const RecordData& record, std::ostream* stream) {
+  *stream << (record.granted ? "granted " : "refused ")
+          << (record.permissions ? describe(*record.permissions) : "without permissions") << ", "
+          << (record.options ? compactJson(*record.options) : "no options");
+}
+
 class Scene {
  public:
   explicit Scene(FakeClientData clientData = photosClient(), FakePlatform& onPlatform = freshPlatform())
@@ -132,6 +138,18 @@ class Scene {
     const std::size_t earlier = platform.completions().size();
     const OperationEnd end = platform.run([&] { operation(platform.completion()); });
     EXPECT_EQ(end, OperationEnd::returned);
+    return onlyCompletionAfter(earlier);
+  }
+
+  /// The same on the calling thread, for an operation that waits for nobody but the threads that it starts itself.
+  CompletionCall performHere(const std::function<void(const AccessCompletion&)>& operation) {
+    const std::size_t earlier = platform.completions().size();
+    operation(platform.completion());
+    return onlyCompletionAfter(earlier);
+  }
+
+ private:
+  CompletionCall onlyCompletionAfter(std::size_t earlier) const {
     const std::vector<CompletionCall> calls = platform.completions();
     EXPECT_EQ(calls.size() - earlier, 1U) << "A completion is called exactly once.";
     return calls.size() > earlier ? calls.back() : CompletionCall{};
