@@ -1,6 +1,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <thread>
+#include <vector>
+
 #include "Tests/Host/Identity/Identify.h"
 #include "Tests/Host/Identity/Records.h"
 
@@ -131,6 +134,26 @@ TEST(AProgramWhosePathCannotBeShown, IsRefused) {
   const ClientRegistry registry({});
   const CallerProcess caller({program});
   EXPECT_THAT(refusal(registry, caller.pid()), AllOf(HasSubstr("cannot be shown"), HasSubstr("/pro gram")));
+}
+
+TEST(ARegistry, ServesManyThreadsAtOnce) {
+  const Records folder;
+  const auto photos = folder.copyProgram("photos");
+  folder.writePhotos(Records::executable(photos));
+  const ClientRegistry registry({folder.path()});
+  const CallerProcess known({photos});
+  const CallerProcess unknown({CALLER_PROGRAM});
+  std::vector<std::thread> threads;
+  for (int count = 0; count < 8; ++count) {
+    threads.emplace_back([&] {
+      for (int turn = 0; turn < 50; ++turn) {
+        EXPECT_EQ(identify(registry, known.pid())->id(), "org.example.photos");
+        EXPECT_EQ(identify(registry, unknown.pid())->id(), CALLER_PROGRAM);
+        EXPECT_EQ(registry.clients().size(), 1U);
+      }
+    });
+  }
+  for (std::thread& thread : threads) thread.join();
 }
 
 }  // namespace
