@@ -10,6 +10,7 @@
 #include <filesystem>
 #include <random>
 #include <string>
+#include <string_view>
 
 #include "Host/Daemon/PluginLoader.h"
 #include "Tests/Host/ModuleFolder.h"
@@ -24,10 +25,12 @@ namespace {
 
 constexpr std::size_t step = 64;
 
+std::string quoted(const std::filesystem::path& path) { return std::string("'").append(path.string()).append("'"); }
+
 template <typename Number>
-std::string withNumber(std::string bytes, std::size_t offset, Number number) {
-  bytes.replace(offset, sizeof number, reinterpret_cast<const char*>(&number), sizeof number);
-  return bytes;
+std::string withNumber(const std::string& bytes, std::size_t offset, Number number) {
+  const std::string_view numberBytes(reinterpret_cast<const char*>(&number), sizeof number);
+  return bytes.substr(0, offset).append(numberBytes).append(bytes, offset + sizeof number, std::string::npos);
 }
 
 std::string withoutSectionTable(const std::string& bytes) {
@@ -47,7 +50,10 @@ TEST(APathThatIsNoModule, IsRefused) {
   const std::filesystem::path dangling = folder.path() / "dangling.so";
   std::filesystem::create_symlink(folder.path() / "gone.so", dangling);
 
-  const std::pair<std::filesystem::path, std::string> cases[] = {
+  const struct {
+    std::filesystem::path file;
+    const char* problem;
+  } cases[] = {
       {"", "its path cannot be followed"},
       {folder.path() / "missing.so", "there is no such file"},
       {folder.install("good") / "below.so", "there is no such file"},
@@ -76,7 +82,7 @@ TEST(APathThatIsNoModule, IsRefused) {
   };
   for (const auto& [file, problem] : cases) {
     SCOPED_TRACE(file);
-    EXPECT_THAT(refusalOf(file), AllOf(HasSubstr("'" + file.string() + "'"), HasSubstr(problem)));
+    EXPECT_THAT(refusalOf(file), AllOf(HasSubstr(quoted(file)), HasSubstr(problem)));
   }
 }
 
@@ -96,7 +102,7 @@ TEST(AModuleInAFolderThatOthersCanWrite, IsRefusedUnlessTheFolderIsSticky) {
   const ModuleFolder folder;
   const std::filesystem::path file = folder.install("good");
   ASSERT_EQ(chmod(folder.path().c_str(), 0777), 0);
-  EXPECT_THAT(refusalOf(file), HasSubstr("its folder '" + folder.path().string() + "' is writable by other users"));
+  EXPECT_THAT(refusalOf(file), HasSubstr("its folder " + quoted(folder.path()) + " is writable by other users"));
   ASSERT_EQ(chmod(folder.path().c_str(), 01777), 0);
   EXPECT_THAT(refusalOf(file), IsEmpty());
 }
@@ -109,7 +115,7 @@ TEST(AModuleOfAnotherUser, IsRefused) {
   EXPECT_THAT(refusalOf(file), HasSubstr("it belongs to another user (user ID 65534)"));
   ASSERT_EQ(chown(file.c_str(), 0, 0), 0);
   ASSERT_EQ(chown(folder.path().c_str(), 65534, 65534), 0);
-  EXPECT_THAT(refusalOf(file), HasSubstr("its folder '" + folder.path().string() + "' belongs to another user"));
+  EXPECT_THAT(refusalOf(file), HasSubstr("its folder " + quoted(folder.path()) + " belongs to another user"));
 }
 
 TEST(AModuleThatWasCutOff, IsRefusedAtEveryLength) {
