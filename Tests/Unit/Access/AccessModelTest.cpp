@@ -132,6 +132,12 @@ std::string describeRequest(const model::Request& request) {
   return line + " description=" + text(request.description) + " server=" + answerOf(request).data.value_or("none");
 }
 
+// Thousands of requests do not wait for thousands of threads.
+ServerAnswer atOnce(ServerAnswer answer) {
+  answer.delivery = Delivery::inLine;
+  return answer;
+}
+
 // The request carried out by the plug-in.
 class Trial {
  public:
@@ -144,10 +150,15 @@ class Trial {
     AlertAnswer answer;
     if (request.responseWord) answer.word = *request.responseWord;
     _scene.platform.alert.answers = {answer};
-    _scene.platform.social.descriptionAnswers = {request.description ? ServerAnswer{.data = *request.description}
-                                                                     : serverCannotBeReached()};
-    _scene.platform.social.authorizationAnswers = {answerOf(request)};
-    _answer = _scene.requestAccess(request.options ? std::optional(dictionaryOf(*request.options)) : std::nullopt);
+    _scene.platform.social.descriptionAnswers = {
+        atOnce(request.description ? ServerAnswer{.data = *request.description} : serverCannotBeReached())};
+    _scene.platform.social.authorizationAnswers = {atOnce(answerOf(request))};
+    const auto options = request.options ? std::make_shared<const Dictionary>(dictionaryOf(*request.options))
+                                         : std::shared_ptr<const Dictionary>();
+    _answer = _scene.performHere([&](const AccessCompletion& completion) {
+      _scene.plugin->handleAccessRequestToAccountsOfType(_scene.facebook, _scene.client, options, _scene.store, true,
+                                                         completion);
+    });
   }
 
   const CompletionCall& answer() const { return _answer; }

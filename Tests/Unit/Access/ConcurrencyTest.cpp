@@ -184,7 +184,7 @@ class HandlerKeepingFramework final : public SocialFramework {
 };
 
 TEST(AnAnswerOnManyThreadsAtOnce, IsHeardOnce) {
-  for (int round = 0; round < 50; ++round) {
+  for (int round = 0; round < 30; ++round) {
     Scene scene;
     HandlerKeepingFramework framework(scene.platform.social);
     PlatformServices services = scene.platform.services();

@@ -132,7 +132,7 @@ TEST_P(AHostileText, AsAPermissionIsNotWhatItLooksLike) {
 }
 
 TEST_P(AHostileText, AsAnAppIDOfAnEarlierGrantIsComparedWhole) {
-  for (const std::string& other : {GetParam() + "\0"s, GetParam() + "x", "x" + GetParam()}) {
+  for (const std::string& other : {GetParam() + '\0', GetParam() + 'x', 'x' + GetParam()}) {
     SceneWithAnAllowingUser scene;
     scene.platform.alert.answers = {userRefuses()};
     scene.addRecord({.options = persistentOptions({}, GetParam()), .permissions = PermissionSet{"email"}});
@@ -147,7 +147,7 @@ TEST_P(AHostileText, AsAnAudienceIsAnAudience) {
   EXPECT_EQ(shownMessage(scene), "no alert");
 
   scene.platform.alert.answers = {userRefuses()};
-  EXPECT_THAT(scene.requestAccess(optionsAskingFor({"publish"}, GetParam() + "\0"s)), isRefusalWith(accountsError(7)));
+  EXPECT_THAT(scene.requestAccess(optionsAskingFor({"publish"}, GetParam() + '\0')), isRefusalWith(accountsError(7)));
 }
 
 TEST_P(AHostileText, AsANameIsShownAsItIs) {
@@ -194,13 +194,21 @@ TEST(ADescriptionWithAPlaceholder, IsShownVerbatim) {
 Value nested(std::size_t depth, const Value& innermost) {
   Value value = innermost;
   for (std::size_t level = 0; level < depth; ++level) {
-    value = level % 2 == 0 ? Value(Array{std::move(value)}) : Value(Dictionary{{permissionsKey, std::move(value)}});
+    if (level % 2 == 0) {
+      Array array;
+      array.push_back(std::move(value));
+      value = Value(std::move(array));
+    } else {
+      Dictionary dictionary;
+      dictionary.set(permissionsKey, std::move(value));
+      value = Value(std::move(dictionary));
+    }
   }
   return value;
 }
 
 TEST(AValueDeepInsideTheOptions, IsNeitherAPermissionNorAnAudienceNorAnAppID) {
-  for (const std::size_t depth : {1U, 2U, 10U, 500U}) {
+  for (const std::size_t depth : {1U, 2U, 500U}) {
     for (const Value& innermost : {Value("publish"), Value(nullptr), Value(Array{"publish"})}) {
       SceneWithAnAllowingUser scene;
       const Value value = nested(depth, innermost);

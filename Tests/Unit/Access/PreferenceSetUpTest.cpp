@@ -194,7 +194,7 @@ TEST(APreferenceRead, NeverOverlapsTheResynchronisationOfTheDomain) {
     plugin->_shouldIgnoreAccessRequest();
 
     constexpr int threadCount = 4;
-    constexpr int rounds = 200;
+    constexpr int rounds = 50;
     std::latch start(2 * threadCount);
     {
       std::vector<std::jthread> threads;
