@@ -56,6 +56,7 @@ CurlLibrary load() {
   find(library, "curl_slist_append", curl.listAppend);
   find(library, "curl_slist_free_all", curl.listFree);
   find(library, "SSL_CTX_set_keylog_callback", curl.setKeyLogCallback);
+  find(library, "SSL_has_pending", curl.tlsHasPending);
   return curl;
 }
 

@@ -32,8 +32,9 @@ struct CurlLibrary {
   decltype(&curl_slist_append) listAppend;
   decltype(&curl_slist_free_all) listFree;
 
-  /// OpenSSL's, by which connections are kept from writing their keys to a file that the environment names.
+  /// OpenSSL's SSL_CTX_set_keylog_callback and SSL_has_pending.
   void (*setKeyLogCallback)(void* sslContext, void (*callback)(const void*, const char*));
+  int (*tlsHasPending)(const void* connection);
 
   static const CurlLibrary& loaded();
 };

@@ -3,6 +3,7 @@
 /// Everything that a transfer may and may not do is said to libcurl here, also where its default would do: what a default
 /// leaves open, the environment decides.
 
+#include <poll.h>
 #include <sys/socket.h>
 
 #include <algorithm>
@@ -10,9 +11,12 @@
 #include <new>
 #include <stdexcept>
 #include <string_view>
+#include <utility>
 
 namespace palisade {
 namespace {
+
+constexpr auto authoritiesAreKept = std::chrono::hours(1);
 
 // No socket is inherited by the programs that a daemon starts.
 curl_socket_t openSocket(void*, curlsocktype, curl_sockaddr* address) {
@@ -78,6 +82,8 @@ void CurlTransfer::setRequest() {
   set(CURLOPT_WRITEDATA, this);
   set(CURLOPT_HEADERFUNCTION, &CurlTransfer::takeHeader);
   set(CURLOPT_HEADERDATA, this);
+  set(CURLOPT_PREREQFUNCTION, &CurlTransfer::beforeRequest);
+  set(CURLOPT_PREREQDATA, this);
 }
 
 void CurlTransfer::setLimits() {
@@ -104,8 +110,10 @@ void CurlTransfer::setSecurity() {
   set(CURLOPT_SSLVERSION, long{CURL_SSLVERSION_TLSv1_2});
   set(CURLOPT_SSL_VERIFYPEER, 1L);
   set(CURLOPT_SSL_VERIFYHOST, 2L);
-  // Without a folder of authorities the library reads the file of authorities once and keeps it for later connections.
+  // Without a folder of authorities the library reads the file of authorities once and keeps it for later connections. It
+  // looks again after a while, since an authority may have lost its trust.
   set(CURLOPT_CAPATH, static_cast<const char*>(nullptr));
+  set(CURLOPT_CA_CACHE_TIMEOUT, static_cast<long>(std::chrono::seconds(authoritiesAreKept).count()));
   if (_options.certificateAuthorities) set(CURLOPT_CAINFO, _options.certificateAuthorities->c_str());
   set(CURLOPT_SSL_CTX_FUNCTION, &forgetKeyLog);
   set(CURLOPT_SSL_CTX_DATA, &_curl);
@@ -153,6 +161,32 @@ std::size_t CurlTransfer::takeHeader(char* bytes, std::size_t size, std::size_t 
     if (self._encoded) return 0;
   }
   return length;
+}
+
+int CurlTransfer::beforeRequest(void* transfer, char*, char*, int, int) noexcept {
+  auto& self = *static_cast<CurlTransfer*>(transfer);
+  self._mustStartAfresh = self.isSpoilt();
+  return self._mustStartAfresh ? CURL_PREREQFUNC_ABORT : CURL_PREREQFUNC_OK;
+}
+
+// A server that has said something on a kept connection before it was asked, an answer twice say, would have that taken for the
+// answer to this request: for another client's token, perhaps.
+bool CurlTransfer::isSpoilt() const {
+  long newConnections = 0;
+  _curl.easyGetInfo(_handle.get(), CURLINFO_NUM_CONNECTS, &newConnections);
+  if (newConnections > 0) return false;
+  pollfd connection = {.fd = -1, .events = POLLIN, .revents = 0};
+  _curl.easyGetInfo(_handle.get(), CURLINFO_ACTIVESOCKET, &connection.fd);
+  if (poll(&connection, 1, 0) != 0) return true;
+  const curl_tlssessioninfo* tls = nullptr;
+  _curl.easyGetInfo(_handle.get(), CURLINFO_TLS_SSL_PTR, &tls);
+  return tls != nullptr && tls->internals != nullptr && _curl.tlsHasPending(tls->internals) != 0;
+}
+
+bool CurlTransfer::mustStartAfresh() {
+  if (!std::exchange(_mustStartAfresh, false)) return false;
+  set(CURLOPT_FRESH_CONNECT, 1L);
+  return true;
 }
 
 HttpResult CurlTransfer::result(CURLcode code) {

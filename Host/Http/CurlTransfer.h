@@ -23,6 +23,10 @@ class CurlTransfer {
 
   CURL* handle() const { return _handle.get(); }
 
+  /// Whether nothing has been sent, because the connection that was to be used again had been spoilt. The transfer is then
+  /// ready to be carried on a fresh one.
+  bool mustStartAfresh();
+
   /// What came of it. To be asked once, when libcurl has said how the transfer ended.
   HttpResult result(CURLcode code);
 
@@ -37,6 +41,9 @@ class CurlTransfer {
   static std::size_t takeBody(char* bytes, std::size_t size, std::size_t count, void* transfer) noexcept;
   static std::size_t takeHeader(char* bytes, std::size_t size, std::size_t count, void* transfer) noexcept;
 
+  static int beforeRequest(void* transfer, char*, char*, int, int) noexcept;
+  bool isSpoilt() const;
+
   Error failure(CURLcode code) const;
   std::string server() const;
 
@@ -48,6 +55,7 @@ class CurlTransfer {
   std::array<char, CURL_ERROR_SIZE> _message = {};
   std::string _body;
   std::size_t _headSize = 0;
+  bool _mustStartAfresh = false;
   bool _headIsComplete = false;
   bool _tooLarge = false;
   bool _encoded = false;

@@ -77,6 +77,7 @@ void TransferThread::run() {
     int stillRunning = 0;
     _curl->multiPerform(_multi, &stillRunning);
     settleFinished();
+    // Returns at once for a transfer that starts afresh.
     _curl->multiPoll(_multi, nullptr, 0, untilSomethingHappens, nullptr);
   }
   while (!_transfers.empty()) giveUp(_transfers.begin()->first);
@@ -106,7 +107,14 @@ void TransferThread::settleFinished() {
     const auto finished = std::find_if(_transfers.begin(), _transfers.end(), [message](const auto& entry) {
       return entry.second.carried->handle() == message->easy_handle;
     });
-    settle(finished->first, finished->second.carried->result(message->data.result));
+    CurlTransfer& transfer = *finished->second.carried;
+    const CURLcode code = message->data.result;
+    if (transfer.mustStartAfresh()) {
+      _curl->multiRemove(_multi, transfer.handle());
+      _curl->multiAdd(_multi, transfer.handle());
+    } else {
+      settle(finished->first, transfer.result(code));
+    }
   }
 }
 
