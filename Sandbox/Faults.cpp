@@ -12,6 +12,7 @@ constexpr FaultKindName kinds[] = {
     {FaultKind::stall, "stall", "stops after --bytes of the answer (0) and keeps the connection"},
     {FaultKind::close, "close", "ends the connection after --bytes of the answer (0)"},
     {FaultKind::reset, "reset", "resets the connection after --bytes of the answer (0)"},
+    {FaultKind::twice, "twice", "answers twice, beginning with a packet of --bytes (0)"},
     {FaultKind::redirect, "redirect", "answers --status (302) with --location"},
     {FaultKind::unavailable, "unavailable", "answers --status (503), with --retry-after if that is given"},
     {FaultKind::status, "status", "answers --status (500)"},

@@ -25,6 +25,7 @@ enum class FaultKind {
   stall,
   close,
   reset,
+  twice,
   redirect,
   unavailable,
   status,

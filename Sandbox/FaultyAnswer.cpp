@@ -2,6 +2,8 @@
 
 #include <zlib.h>
 
+#include <algorithm>
+#include <cstdio>
 #include <stdexcept>
 #include <thread>
 #include <vector>
@@ -93,6 +95,11 @@ void answerWithFault(const Fault& fault, const std::string& answer, RawConnectio
     case FaultKind::reset:
       connection.write(answer.substr(0, fault.bytes));
       connection.reset();
+      break;
+    case FaultKind::twice:
+      connection.write(answer.substr(0, fault.bytes));
+      connection.write(answer.substr(std::min(fault.bytes, answer.size())) + answer);
+      connection.waitForClient();
       break;
     case FaultKind::huge: writeHugeBody(connection); break;
     case FaultKind::bomb: connection.write(json(200, bomb(), "Content-Encoding: gzip\r\n")); break;

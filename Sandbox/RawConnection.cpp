@@ -26,8 +26,8 @@ bool RawConnection::write(std::string_view bytes) {
 }
 
 void RawConnection::waitForClient() {
-  pollfd hungUp = {.fd = SSL_get_fd(&_connection), .events = POLLRDHUP, .revents = 0};
-  poll(&hungUp, 1, -1);
+  pollfd heard = {.fd = SSL_get_fd(&_connection), .events = POLLIN | POLLRDHUP, .revents = 0};
+  poll(&heard, 1, -1);
 }
 
 void RawConnection::reset() {

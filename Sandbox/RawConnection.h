@@ -23,7 +23,7 @@ class RawConnection {
   /// False when the client is gone.
   bool write(std::string_view bytes);
 
-  /// Returns when the client has ended the connection.
+  /// Returns when the client has ended the connection, or says something more.
   void waitForClient();
 
   void reset();
