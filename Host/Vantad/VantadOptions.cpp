@@ -5,6 +5,8 @@
 #include <cstdlib>
 #include <stdexcept>
 
+#include "Host/Daemon/Paths.h"
+
 namespace palisade {
 namespace {
 
@@ -13,36 +15,49 @@ constexpr const char* help = R"(Usage: vantad [OPTION...]
 The social daemon: asks the Facebook server to make tokens invalid whose clients have lost their access, and asks again until
 the server has confirmed it. It runs until SIGTERM or SIGINT, one process for each state directory.
 
-  --state DIRECTORY        where the outbox and the vault are (default: $XDG_STATE_HOME/palisade, else ~/.local/state/palisade)
-  --configuration FILE     where the server is (default: $XDG_CONFIG_HOME/palisade/server.toml, else under ~/.config)
-  --keychain CHOICE        automatic, secret-service or vault (default: automatic)
-  --verbose                log debug records too
-  --help                   this text
+  --state DIRECTORY       where the outbox and the vault are (default: $XDG_STATE_HOME/palisade, else ~/.local/state/palisade)
+  --configuration FILE    where the server is (default: $XDG_CONFIG_HOME/palisade/server.toml, else under ~/.config)
+  --keychain CHOICE       automatic, secret-service or vault
+  --log LEVEL             error, notice or debug
+  -h, --help              show this
+  --version               show the version
 
-server.toml needs one line, address = "https://HOST"; it is read again whenever it changes.
+What --keychain and --log leave open is taken from accountd.toml beside server.toml. server.toml needs one line,
+address = "https://HOST"; it is read again whenever it changes.
 )";
 
-std::filesystem::path folderFrom(const char* variable, const char* underHome) {
-  const char* const folder = std::getenv(variable);
-  if (folder != nullptr && *folder == '/') return std::filesystem::path(folder) / "palisade";
-  const char* const home = std::getenv("HOME");
-  if (home == nullptr || *home != '/') throw std::invalid_argument("There is no home directory: set HOME, or name every path.");
-  return std::filesystem::path(home) / underHome / "palisade";
+KeychainChoice keychainFrom(const std::string& name) {
+  if (const auto choice = keychainChoiceNamed(name)) return *choice;
+  throw std::invalid_argument("There is no keychain \"" + name + "\": it is automatic, secret-service or vault.");
 }
 
-KeychainChoice choiceFrom(const std::string& name) {
-  if (const auto choice = keychainChoiceNamed(name)) return *choice;
-  throw std::invalid_argument("\"" + name + "\" is no keychain; choose automatic, secret-service or vault.");
+LogLevel logLevelFrom(const std::string& name) {
+  if (name == "error") return LogLevel::error;
+  if (name == "notice") return LogLevel::notice;
+  if (name == "debug") return LogLevel::debug;
+  throw std::invalid_argument("There is no log level \"" + name + "\": it is error, notice or debug.");
 }
 
 std::filesystem::path absolutePath(const char* path) { return std::filesystem::absolute(path).lexically_normal(); }
 
+const std::string* textIn(const Dictionary& table, std::string_view key) {
+  const Value* const value = table.find(key);
+  return value == nullptr ? nullptr : value->string();
+}
+
 }  // namespace
+
+void VantadOptions::takeDefaultsFrom(const Dictionary& accountdTable) {
+  const std::string* const keychainName = textIn(accountdTable, "keychain");
+  if (!keychain && keychainName != nullptr) keychain = keychainFrom(*keychainName);
+  const std::string* const levelName = textIn(accountdTable, "log");
+  if (!logLevel && levelName != nullptr) logLevel = logLevelFrom(*levelName);
+}
 
 KeychainOptions VantadOptions::keychainOptions() const {
   const char* const credentials = std::getenv("CREDENTIALS_DIRECTORY");
   return {
-      .choice = keychain,
+      .choice = keychain.value_or(KeychainChoice::automatic),
       .vault = {.path = state / "vault.sqlite",
                 .keyFile = state / "vault.key",
                 .credentialsFolder = credentials == nullptr ? std::nullopt : std::optional<std::filesystem::path>(credentials)},
@@ -50,26 +65,30 @@ KeychainOptions VantadOptions::keychainOptions() const {
 }
 
 VantadOptions parseVantadOptions(int count, char** words) {
-  static constexpr option known[] = {
-      {"help", no_argument, nullptr, 'h'},           {"verbose", no_argument, nullptr, 'v'},
-      {"state", required_argument, nullptr, 's'},    {"configuration", required_argument, nullptr, 'c'},
-      {"keychain", required_argument, nullptr, 'k'}, {nullptr, 0, nullptr, 0}};
+  static constexpr option known[] = {{"help", no_argument, nullptr, 'h'},
+                                     {"version", no_argument, nullptr, 'v'},
+                                     {"state", required_argument, nullptr, 's'},
+                                     {"configuration", required_argument, nullptr, 'c'},
+                                     {"keychain", required_argument, nullptr, 'k'},
+                                     {"log", required_argument, nullptr, 'l'},
+                                     {nullptr, 0, nullptr, 0}};
   VantadOptions options;
   opterr = 0;
   for (int letter = 0; (letter = getopt_long(count, words, "h", known, nullptr)) != -1;) {
     switch (letter) {
-      case 'h': options.wantsHelp = true; return options;
-      case 'v': options.isVerbose = true; break;
+      case 'h': options.request = VantadOptions::Request::help; return options;
+      case 'v': options.request = VantadOptions::Request::version; return options;
       case 's': options.state = absolutePath(optarg); break;
       case 'c': options.configuration = absolutePath(optarg); break;
-      case 'k': options.keychain = choiceFrom(optarg); break;
+      case 'k': options.keychain = keychainFrom(optarg); break;
+      case 'l': options.logLevel = logLevelFrom(optarg); break;
       default:
         throw std::invalid_argument("There is no such option, or it lacks its value: " + std::string(words[optind - 1]) + ".");
     }
   }
   if (optind < count) throw std::invalid_argument("A word too many: " + std::string(words[optind]) + ".");
-  if (options.state.empty()) options.state = folderFrom("XDG_STATE_HOME", ".local/state");
-  if (options.configuration.empty()) options.configuration = folderFrom("XDG_CONFIG_HOME", ".config") / "server.toml";
+  if (options.state.empty()) options.state = stateFolder();
+  if (options.configuration.empty()) options.configuration = configurationFolder() / "server.toml";
   return options;
 }
 

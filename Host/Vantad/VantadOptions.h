@@ -1,23 +1,35 @@
 #pragma once
 
-/// The command line of vantad. Pure but for the environment. Errors: `std::invalid_argument` with a sentence for the user.
+/// What vantad is told: its command line over accountd.toml over the defaults.
+///
+/// Threads and ownership: a value. Errors: `std::invalid_argument` with a sentence for the user.
 
 #include <filesystem>
+#include <optional>
 #include <string>
 
 #include "Host/Keychain/OpenKeychain.h"
+#include "Platform/Log.h"
+#include "Platform/Value.h"
 
 namespace palisade {
 
 struct VantadOptions {
-  bool wantsHelp = false;
-  bool isVerbose = false;
+  enum class Request { serve, help, version };
+
+  Request request = Request::serve;
   std::filesystem::path state;
+  /// server.toml; accountd.toml stands beside it.
   std::filesystem::path configuration;
-  KeychainChoice keychain = KeychainChoice::automatic;
+  std::optional<KeychainChoice> keychain;
+  std::optional<LogLevel> logLevel;
+
+  /// Takes what the command line left open. The keychain has to be the account daemon's.
+  void takeDefaultsFrom(const Dictionary& accountdTable);
 
   std::filesystem::path outbox() const { return state / "outbox.sqlite"; }
   std::filesystem::path lock() const { return state / "vantad.lock"; }
+  std::filesystem::path accountdConfiguration() const { return configuration.parent_path() / "accountd.toml"; }
   KeychainOptions keychainOptions() const;
 };
 

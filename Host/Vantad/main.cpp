@@ -7,23 +7,37 @@
 
 #include "Host/Http/Environment.h"
 #include "Host/Log/JournalLog.h"
+#include "Host/Preferences/TomlFile.h"
 #include "Host/Secrets/ProcessSecrecy.h"
 #include "Host/Vantad/Vantad.h"
 
+namespace {
+
+using namespace palisade;
+
+void serve(VantadOptions options) {
+  forgetNetworkEnvironment();
+  dropDumpable();
+  if (const auto table = readTomlFile(options.accountdConfiguration())) options.takeDefaultsFrom(*table);
+  JournalLog log(options.logLevel.value_or(LogLevel::notice), nullptr);
+  Vantad(options, log).run();
+}
+
+void run(const VantadOptions& options) {
+  switch (options.request) {
+    case VantadOptions::Request::help: std::fputs(vantadHelp().c_str(), stdout); break;
+    case VantadOptions::Request::version: std::puts("vantad " PALISADE_VERSION); break;
+    case VantadOptions::Request::serve: serve(options); break;
+  }
+}
+
+}  // namespace
+
 int main(int count, char** words) {
-  using namespace palisade;
   constexpr int failure = 2;
   constexpr int notNeeded = 1;
   try {
-    const VantadOptions options = parseVantadOptions(count, words);
-    if (options.wantsHelp) {
-      std::fputs(vantadHelp().c_str(), stdout);
-      return EXIT_SUCCESS;
-    }
-    forgetNetworkEnvironment();
-    dropDumpable();
-    JournalLog log(options.isVerbose ? LogLevel::debug : LogLevel::notice, nullptr);
-    Vantad(options, log).run();
+    run(parseVantadOptions(count, words));
     return EXIT_SUCCESS;
   } catch (const AlreadyRunning& error) {
     std::fprintf(stderr, "vantad: %s It runs already.\n", error.what());
