@@ -123,6 +123,22 @@ INSTANTIATE_TEST_SUITE_P(EachStatusAndPlace, ARedirect,
                                           testing::Values("https", "http", "file", "path")),
                          [](const auto& test) { return std::to_string(std::get<0>(test.param)) + std::get<1>(test.param); });
 
+// Attack 12.
+class AnAnswerThatComesTwice : public testing::TestWithParam<int> {};
+
+TEST_P(AnAnswerThatComesTwice, IsNotTakenForTheAnswerToTheNextRequest) {
+  Sandbox sandbox;
+  sandbox.arm({{"kind", "twice"}, {"bytes", std::to_string(GetParam())}});
+  HttpClient client(sandbox.trusted());
+  EXPECT_EQ(answerOf(ask(client, meRequest(sandbox))).statusCode, 401);
+  const HttpAnswer next =
+      answerOf(ask(client, {.url = sandbox.url("/oauth/authorization"), .bearerToken = sandbox.masterToken(), .form = ""}));
+  EXPECT_EQ(next.statusCode, 400);
+  EXPECT_THAT(next.body, HasSubstr("invalid_request"));
+}
+
+INSTANTIATE_TEST_SUITE_P(BeginningWithBytes, AnAnswerThatComesTwice, testing::Values(0, 1, 30, 84, 86, 88, 90, 100, 150));
+
 struct RetryCase {
   std::string name;
   std::string text;

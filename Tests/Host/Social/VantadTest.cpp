@@ -72,7 +72,7 @@ class Vantad : public testing::Test {
   ChildProcess::Command command() const {
     return {.program = VANTAD_PROGRAM,
             .arguments = {"--state", state().string(), "--configuration", (_configuration.path() / "server.toml").string(),
-                          "--keychain", "vault", "--verbose"},
+                          "--keychain", "vault", "--log", "debug"},
             .log = log()};
   }
 
@@ -283,6 +283,23 @@ TEST_F(Vantad, WritesNoTokenAnywhere) {
   EXPECT_THAT(written, Not(HasSubstr(sandbox.masterToken())));
 }
 
+TEST_F(Vantad, UsesTheKeychainThatAccountdUses) {
+  ChildProcess::Command left = command();
+  left.arguments = {"--state", state().string(), "--configuration", command().arguments[3]};
+  const auto accountdConfiguration = std::filesystem::path(command().arguments[3]).parent_path() / "accountd.toml";
+  writeTomlFile(accountdConfiguration, {{"keychain", "vault"}, {"plugins", "/elsewhere"}});
+  outbox.add(accountID, "app");
+  {
+    ChildProcess vantad(left);
+    EXPECT_TRUE(settlesEverything()) << contentOf(log());
+  }
+  EXPECT_EQ(outbox.latest(1).front().state, InvalidationState::confirmed);
+  writeTomlFile(accountdConfiguration, {{"keychain", "drawer"}});
+  ChildProcess vantad(left);
+  EXPECT_EQ(vantad.wait(), 2);
+  EXPECT_THAT(contentOf(log()), HasSubstr("\"drawer\""));
+}
+
 TEST(VantadsCommandLine, ExplainsItself) {
   ChildProcess vantad({.program = VANTAD_PROGRAM, .arguments = {"--help"}});
   EXPECT_THAT(vantad.readLine().value_or(""), HasSubstr("Usage: vantad"));
@@ -300,6 +317,7 @@ TEST_P(ABadOption, IsAnErrorThatNamesIt) {
 
 INSTANTIATE_TEST_SUITE_P(Table, ABadOption,
                          testing::Values(std::vector<std::string>{"--frob"}, std::vector<std::string>{"--state"},
-                                         std::vector<std::string>{"--keychain", "drawer"}, std::vector<std::string>{"word"}));
+                                         std::vector<std::string>{"--keychain", "drawer"},
+                                         std::vector<std::string>{"--log", "loud"}, std::vector<std::string>{"word"}));
 
 }  // namespace
