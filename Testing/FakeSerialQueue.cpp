@@ -1,37 +1,32 @@
 #include "Testing/FakeSerialQueue.h"
 
-#include <atomic>
 #include <future>
 #include <utility>
+
+// An activity is begun before the queue's mutex is touched from outside: whoever has to wait for that mutex then waits for a
+// thread that is known to be busy.
 
 namespace palisade {
 namespace {
 
 thread_local const FakeSerialQueue* currentQueue = nullptr;
 
-std::atomic<std::uint64_t> givenWork = 0;
-std::atomic<std::uint64_t> doneWork = 0;
-
 }  // namespace
 
-FakeSerialQueue::FakeSerialQueue(Instruments instruments, std::string_view label)
-    : _instruments(instruments),
-      _label(label),
-      _thread([this] { run(); }) {}
+FakeSerialQueue::FakeSerialQueue(Instruments instruments, std::string_view label) : _instruments(instruments), _label(label) {
+  _activity.begin();
+  _thread = std::thread([this] { run(); });
+}
 
 FakeSerialQueue::~FakeSerialQueue() {
+  _activity.begin();
   {
     const std::lock_guard lock(_mutex);
     _isClosing = true;
   }
   _changed.notify_all();
   _thread.join();
-}
-
-FakeSerialQueue::Work FakeSerialQueue::workInProcess() {
-  // In this order, work that is given and done between the two looks makes a difference instead of an accidental balance.
-  const std::uint64_t done = doneWork;
-  return {.given = givenWork, .done = done};
+  _activity.end();
 }
 
 std::optional<std::string> FakeSerialQueue::labelOfCurrent() {
@@ -60,36 +55,49 @@ void FakeSerialQueue::sync(const std::function<void()>& work) {
 }
 
 void FakeSerialQueue::drain() {
-  std::unique_lock lock(_mutex);
-  _changed.wait(lock, [this] { return _work.empty() && !_isWorking; });
+  _activity.begin();
+  {
+    std::unique_lock lock(_mutex);
+    _changed.wait(lock, [this] { return _unfinished == 0; });
+  }
+  _activity.end();
 }
 
 void FakeSerialQueue::push(std::function<void()> work) {
-  ++givenWork;
+  _activity.begin();
   {
     const std::lock_guard lock(_mutex);
     _work.push_back(std::move(work));
+    ++_unfinished;
   }
+  _changed.notify_all();
+}
+
+std::optional<std::function<void()>> FakeSerialQueue::next() {
+  std::unique_lock lock(_mutex);
+  _changed.wait(lock, [this] { return _isClosing || !_work.empty(); });
+  if (_work.empty()) return std::nullopt;
+  std::function<void()> work = std::move(_work.front());
+  _work.pop_front();
+  return work;
+}
+
+void FakeSerialQueue::finishOne() {
+  const std::lock_guard lock(_mutex);
+  --_unfinished;
   _changed.notify_all();
 }
 
 void FakeSerialQueue::run() {
   const ThreadLabelScope label(ThreadLabel::preferences);
   currentQueue = this;
-  std::unique_lock lock(_mutex);
-  for (;;) {
-    _changed.wait(lock, [this] { return _isClosing || !_work.empty(); });
-    if (_work.empty()) return;
-    std::function<void()> work = std::move(_work.front());
-    _work.pop_front();
-    _isWorking = true;
-    lock.unlock();
-    work();
-    work = nullptr;
-    lock.lock();
-    _isWorking = false;
-    _changed.notify_all();
-    ++doneWork;
+  _activity.runsHere();
+  _activity.end();
+  while (auto work = next()) {
+    (*work)();
+    work.reset();
+    finishOne();
+    _activity.end();
   }
 }
 

@@ -6,7 +6,7 @@
 /// asynchronous work ends the process, as it would end the daemon.
 
 #include <condition_variable>
-#include <cstdint>
+#include <cstddef>
 #include <deque>
 #include <functional>
 #include <memory>
@@ -18,6 +18,7 @@
 #include <vector>
 
 #include "Platform/SerialQueue.h"
+#include "Testing/Activity.h"
 #include "Testing/Instruments.h"
 
 namespace palisade {
@@ -26,15 +27,6 @@ class FakeSerialQueue final : public SerialQueue {
  public:
   FakeSerialQueue(Instruments instruments, std::string_view label);
   ~FakeSerialQueue() override;
-
-  /// Pieces of work that were given to the queues of this process, and those of them that have been done.
-  struct Work {
-    std::uint64_t given = 0;
-    std::uint64_t done = 0;
-
-    bool isDone() const { return given == done; }
-  };
-  static Work workInProcess();
 
   /// The label of the queue whose work the calling thread carries out, or none.
   static std::optional<std::string> labelOfCurrent();
@@ -48,6 +40,8 @@ class FakeSerialQueue final : public SerialQueue {
 
  private:
   void push(std::function<void()> work);
+  std::optional<std::function<void()>> next();
+  void finishOne();
   void run();
 
   Instruments _instruments;
@@ -55,8 +49,9 @@ class FakeSerialQueue final : public SerialQueue {
   std::mutex _mutex;
   std::condition_variable _changed;
   std::deque<std::function<void()>> _work;
-  bool _isWorking = false;
+  std::size_t _unfinished = 0;
   bool _isClosing = false;
+  Activity _activity;
   std::thread _thread;
 };
 

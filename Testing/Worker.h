@@ -11,12 +11,9 @@
 #include <functional>
 #include <memory>
 #include <mutex>
-#include <optional>
-#include <string>
 #include <thread>
 
-#include <sys/types.h>
-
+#include "Testing/Activity.h"
 #include "Testing/Trace.h"
 
 namespace palisade {
@@ -33,18 +30,18 @@ class Worker {
 
   bool hasFinished() const;
 
+  /// Waits for the end of the thread when its work has ended. Whether it has.
+  bool joinIfFinished();
+
   /// Waits for the end of the work, at most that long. Whether it has ended.
   bool waitFor(std::chrono::microseconds time) const;
-
-  /// See `endlessWaitOf`.
-  std::optional<std::string> endlessWait() const;
 
  private:
   struct State {
     std::mutex mutex;
     std::condition_variable changed;
-    pid_t thread = 0;
     bool hasFinished = false;
+    Activity activity;
   };
 
   std::shared_ptr<State> _state;

@@ -5,6 +5,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -25,6 +26,8 @@ struct Story {
   std::size_t alerts;
   std::size_t storedRecords;
 };
+
+void PrintTo(const Story& row, std::ostream* stream) { *stream << row.file; }
 
 const Story stories[] = {
     {"audience-changed", {"0 granted", "1 granted"}, 1, 1},

@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <memory>
+#include <ostream>
 
 #include "Host/Json/Json.h"
 #include "Platform/AccountConstants.h"
@@ -147,6 +148,8 @@ struct AlertCase {
   int status;
   AlertResponse word;
 };
+
+void PrintTo(const AlertCase& row, std::ostream* stream) { *stream << row.name; }
 
 class AnAlert : public ::testing::TestWithParam<AlertCase> {};
 

@@ -5,6 +5,7 @@
 
 #include <functional>
 #include <memory>
+#include <ostream>
 #include <stdexcept>
 
 #include "Host/Json/Json.h"
@@ -29,6 +30,8 @@ struct PlatformCall {
   const char* name;
   std::function<void(FakePlatform&)> make;
 };
+
+void PrintTo(const PlatformCall& row, std::ostream* stream) { *stream << row.name; }
 
 const AccountType facebook{std::string(AccountTypeIdentifierFacebook)};
 

@@ -142,6 +142,28 @@ TEST_F(AnOperation, IsNotTakenForWaitingWhileAQueueWorks) {
   }
 }
 
+TEST_F(AnOperation, ThatWaitsForItsOwnQueueIsLeftWaiting) {
+  const auto queue = platform.queues.makeSerialQueue("q");
+  EXPECT_EQ(platform.run([queue] { queue->sync([queue] { queue->sync([] {}); }); }), OperationEnd::waitsForSemaphore);
+}
+
+TEST_F(AnOperation, IsNotTakenForWaitingWhileAQueueStartsOrEnds) {
+  for (int round = 0; round < 200; ++round) {
+    ASSERT_EQ(platform.run([this] { platform.queues.makeSerialQueue("q")->async([] {}); }), OperationEnd::returned);
+  }
+}
+
+TEST_F(AnOperation, ThatWokeAnEarlierOneWaitsForItToRest) {
+  const auto wakeUp = std::make_shared<std::counting_semaphore<>>(0);
+  const auto wait = [this, wakeUp] {
+    wakeUp->acquire();
+    platform.trace.record("woken");
+  };
+  EXPECT_EQ(platform.run(wait), OperationEnd::waitsForSemaphore);
+  EXPECT_EQ(platform.run([wakeUp] { wakeUp->release(); }), OperationEnd::returned);
+  EXPECT_THAT(platform.trace.names(), ElementsAre("woken"));
+}
+
 TEST_F(AnOperation, HasReturnedOnlyWhenTheQueuesHaveDoneWhatItLeftThem) {
   const auto queue = platform.queues.makeSerialQueue("q");
   platform.run([&] {

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <csignal>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -51,6 +52,8 @@ struct OperationEndCase {
   std::vector<std::string> outcomes;
 };
 
+void PrintTo(const OperationEndCase& row, std::ostream* stream) { *stream << row.name; }
+
 class AnOperationOfAModule : public ::testing::TestWithParam<OperationEndCase> {};
 
 TEST_P(AnOperationOfAModule, IsReportedAsItEnds) { EXPECT_EQ(outcomesOfWishes(GetParam().wishes), GetParam().outcomes); }
@@ -88,7 +91,7 @@ TEST(AModule, ThatPrintsDoesNotDisturbTheResults) {
 
 TEST(AModule, ThatMakesNoObjectIsAnError) {
   const ReplayRun run = replayLines(R"({"operations": [{"name": "newPlugin"}, {"name": "newPlugin"}]})");
-  EXPECT_THAT(outcomesOf(run.results().at(0)), ElementsAre("error: the module made no plug-in object"));
+  EXPECT_THAT(outcomesOf(run.results().at(0)), ElementsAre("error: operations[1]: the module made no plug-in object"));
   EXPECT_EQ(run.exitStatus, 2);
 }
 
@@ -182,6 +185,8 @@ struct UsageCase {
   const char* output;
   const char* errors;
 };
+
+void PrintTo(const UsageCase& row, std::ostream* stream) { *stream << row.name; }
 
 class ACommandLine : public ::testing::TestWithParam<UsageCase> {};
 

@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <ostream>
 #include <string>
 
 #include "Host/Json/Json.h"
@@ -36,6 +37,8 @@ struct MalformedScenario {
   const char* json;
   const char* message;
 };
+
+void PrintTo(const MalformedScenario& row, std::ostream* stream) { *stream << row.json; }
 
 const MalformedScenario malformedScenarios[] = {
     {R"([])", R"(the scenario: has to be an object, is an array)"},

@@ -7,6 +7,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "Platform/AccountConstants.h"
@@ -71,5 +72,6 @@ struct Scenario {
 
 /// As it is written in a scenario and in a trace.
 std::string_view nameOf(OperationName name);
+std::optional<OperationName> operationNamed(std::string_view name);
 
 }  // namespace palisade

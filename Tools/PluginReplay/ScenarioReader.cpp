@@ -10,16 +10,6 @@
 namespace palisade {
 namespace {
 
-constexpr std::pair<std::string_view, OperationName> operationNames[] = {
-    {"supportsAccountType", OperationName::supportsAccountType},
-    {"handleAccessRequest", OperationName::handleAccessRequest},
-    {"authorizeAccess", OperationName::authorizeAccess},
-    {"revokeAccess", OperationName::revokeAccess},
-    {"revokeAllAccess", OperationName::revokeAllAccess},
-    {"environmentChange", OperationName::environmentChange},
-    {"newPlugin", OperationName::newPlugin},
-};
-
 std::string identifier(const JsonPlace& place) { return constantValue(place.text()); }
 
 std::optional<std::string> textOrNull(const JsonObject& object, std::string_view member) {
@@ -90,9 +80,9 @@ ScenarioRecord readRecord(const JsonPlace& place, const Scenario& scenario) {
 ScenarioOperation readOperation(const JsonPlace& place, const Scenario& scenario) {
   // Which members an operation has depends on its name, so the name is looked for among all of them first.
   const JsonPlace name = place.object({"name", "identifier", "client", "options", "allowUserInteraction"}).require("name");
-  const auto known = std::ranges::find(operationNames, name.text(), [](const auto& each) { return each.first; });
-  if (known == std::end(operationNames)) name.fail("there is no operation \"" + name.text() + "\"");
-  ScenarioOperation operation{.name = known->second};
+  const auto known = operationNamed(name.text());
+  if (!known) name.fail("there is no operation \"" + name.text() + "\"");
+  ScenarioOperation operation{.name = *known};
   switch (operation.name) {
     case OperationName::supportsAccountType:
       operation.identifier = identifier(place.object({"name", "identifier"}).require("identifier"));
@@ -119,10 +109,6 @@ Value readPreference(const JsonPlace& place) {
 }
 
 }  // namespace
-
-std::string_view nameOf(OperationName name) {
-  return std::ranges::find(operationNames, name, [](const auto& each) { return each.second; })->first;
-}
 
 std::optional<std::string> scenarioID(const Value& document) {
   const Dictionary* scenario = document.dictionary();

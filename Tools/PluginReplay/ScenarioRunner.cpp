@@ -4,6 +4,7 @@
 #include "Tools/PluginReplay/ScenarioRunner.h"
 
 #include <algorithm>
+#include <map>
 #include <stdexcept>
 #include <string>
 #include <utility>
@@ -28,7 +29,7 @@ class ScenarioRun : public std::enable_shared_from_this<ScenarioRun> {
   void makePlugin() {
     _plugin = nullptr;
     _platform.run([self = shared_from_this()] { self->_plugin = self->_module.create(self->_platform.services()); });
-    requirePlugin();
+    requirePlugin("");
   }
 
   // The operation's thread may never end, so it shares in everything that it uses.
@@ -45,7 +46,7 @@ class ScenarioRun : public std::enable_shared_from_this<ScenarioRun> {
       const char* const waiting = end == OperationEnd::waitsForAlert ? "alert" : "semaphore";
       _platform.trace.record("blocked-forever", {{"operation", std::uint64_t{index}}, {"waiting", waiting}});
     }
-    requirePlugin();
+    requirePlugin("operations[" + std::to_string(index) + "]: ");
   }
 
   std::vector<Event> events() const { return _platform.trace.events(); }
@@ -108,8 +109,8 @@ class ScenarioRun : public std::enable_shared_from_this<ScenarioRun> {
                                [&](const Event& event) { return event["operation"] == Value(std::uint64_t{index}); });
   }
 
-  void requirePlugin() const {
-    if (_plugin == nullptr) throw std::runtime_error("the module made no plug-in object");
+  void requirePlugin(const std::string& place) const {
+    if (_plugin == nullptr) throw std::runtime_error(place + "the module made no plug-in object");
   }
 
   const AccountAccessPluginModule& _module;
