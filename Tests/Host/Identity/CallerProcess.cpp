@@ -1,8 +1,10 @@
 #include "Tests/Host/Identity/CallerProcess.h"
 
 #include <fcntl.h>
+#include <poll.h>
 #include <spawn.h>
 #include <sys/socket.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -64,6 +66,7 @@ CallerProcess::CallerProcess(std::vector<std::string> words, const std::string& 
   close(input[0]);
   close(output[1]);
   _caller = writerOfMessage(output[0]);
+  _pin = static_cast<int>(syscall(SYS_pidfd_open, _caller, 0));
   close(output[0]);
 }
 
@@ -84,6 +87,11 @@ void CallerProcess::wait() {
   while (waitpid(_started, nullptr, 0) < 0 && errno == EINTR) {
   }
   _started = -1;
+  // A sandbox that is gone says nothing about the program in it, which may still be on its way out.
+  pollfd end{.fd = _pin, .events = POLLIN, .revents = 0};
+  while (poll(&end, 1, -1) < 0 && errno == EINTR) {
+  }
+  close(_pin);
 }
 
 std::string outputOf(const std::string& command) {

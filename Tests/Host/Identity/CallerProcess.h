@@ -30,6 +30,7 @@ class CallerProcess {
  private:
   pid_t _started = -1;
   pid_t _caller = -1;
+  int _pin = -1;
   int _lifeline = -1;
 };
 
