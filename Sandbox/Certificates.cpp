@@ -17,7 +17,7 @@ constexpr long hour = 3600;
 constexpr long year = 365 * 24 * hour;
 constexpr unsigned weakKeyBits = 1024;
 
-constexpr CertificateKindName kinds[] = {
+constexpr CertificateKindName certificateNames[] = {
     {CertificateKind::good, "good", "nothing is wrong"},
     {CertificateKind::expired, "expired", "valid until an hour ago"},
     {CertificateKind::notYetValid, "not-yet-valid", "valid from the next hour on"},
@@ -119,11 +119,12 @@ File openFile(const std::filesystem::path& path, const char* mode) {
 
 }  // namespace
 
-std::span<const CertificateKindName> certificateKinds() { return kinds; }
+std::span<const CertificateKindName> certificateKinds() { return certificateNames; }
 
 std::optional<CertificateKind> certificateKindNamed(std::string_view name) {
-  const auto found = std::find_if(std::begin(kinds), std::end(kinds), [name](const auto& kind) { return kind.name == name; });
-  return found == std::end(kinds) ? std::nullopt : std::optional(found->kind);
+  const auto found = std::find_if(std::begin(certificateNames), std::end(certificateNames),
+                                  [name](const auto& kind) { return kind.name == name; });
+  return found == std::end(certificateNames) ? std::nullopt : std::optional(found->kind);
 }
 
 Authority::Authority(const std::filesystem::path& folder) {

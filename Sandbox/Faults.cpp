@@ -6,7 +6,7 @@
 namespace palisade::sandbox {
 namespace {
 
-constexpr FaultKindName kinds[] = {
+constexpr FaultKindName faultNames[] = {
     {FaultKind::silent, "silent", "reads the request and never answers"},
     {FaultKind::slow, "slow", "answers one byte every --milliseconds (100)"},
     {FaultKind::stall, "stall", "stops after --bytes of the answer (0) and keeps the connection"},
@@ -36,17 +36,19 @@ int usualStatus(FaultKind kind) {
 }
 
 std::string_view nameOf(FaultKind kind) {
-  return std::find_if(std::begin(kinds), std::end(kinds), [kind](const auto& entry) { return entry.kind == kind; })->name;
+  return std::find_if(std::begin(faultNames), std::end(faultNames), [kind](const auto& entry) { return entry.kind == kind; })
+      ->name;
 }
 
 }  // namespace
 
-std::span<const FaultKindName> faultKinds() { return kinds; }
+std::span<const FaultKindName> faultKinds() { return faultNames; }
 
 std::optional<Fault> faultFromForm(const Form& form) {
   const std::string name = field(form, "kind");
-  const auto kind = std::find_if(std::begin(kinds), std::end(kinds), [&name](const auto& entry) { return entry.name == name; });
-  if (kind == std::end(kinds)) return std::nullopt;
+  const auto kind =
+      std::find_if(std::begin(faultNames), std::end(faultNames), [&name](const auto& entry) { return entry.name == name; });
+  if (kind == std::end(faultNames)) return std::nullopt;
   return Fault{.kind = kind->kind,
                .path = field(form, "path"),
                .times = number(form, "times", 1, most),

@@ -30,6 +30,11 @@ add_compile_options(
 add_compile_definitions($<$<CONFIG:Debug>:_GLIBCXX_ASSERTIONS>)
 add_link_options(-Wl,--as-needed -Wl,-z,relro -Wl,-z,now)
 
+# In a unity build every source is included, and GCC takes it for a header, whose types should not hold unnamed ones.
+if(CMAKE_UNITY_BUILD)
+  add_compile_options(-Wno-subobject-linkage)
+endif()
+
 if(PALISADE_WERROR)
   add_compile_options(-Werror)
 endif()

@@ -19,7 +19,7 @@ namespace {
 
 constexpr const char* busName = "com.veltran.Accounts1";
 constexpr const char* objectPath = "/com/veltran/Accounts1";
-constexpr std::size_t longestToken = 64 * 1024;
+constexpr std::size_t longestAccountToken = 64 * 1024;
 
 using BusRows = std::vector<BusDictionary>;
 
@@ -67,7 +67,8 @@ std::string readToEnd(const sdbus::UnixFd& descriptor) {
     if (length < 0) throw BusFailure(BusFailureKind::invalidArguments, "The token could not be read from its descriptor.");
     if (length == 0) return content;
     content.append(buffer, static_cast<std::size_t>(length));
-    if (content.size() > longestToken) throw BusFailure(BusFailureKind::invalidArguments, "The token is longer than 64 KiB.");
+    if (content.size() > longestAccountToken)
+      throw BusFailure(BusFailureKind::invalidArguments, "The token is longer than 64 KiB.");
   }
 }
 

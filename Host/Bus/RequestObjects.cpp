@@ -7,7 +7,7 @@ namespace palisade {
 namespace {
 
 constexpr const char* requestInterface = "com.veltran.Accounts1.Request";
-constexpr std::size_t longestToken = 64;
+constexpr std::size_t longestHandleToken = 64;
 
 std::string pathElement(std::string uniqueName) {
   std::erase(uniqueName, ':');
@@ -20,7 +20,7 @@ bool isPathElement(const std::string& token) {
     return (character >= 'a' && character <= 'z') || (character >= 'A' && character <= 'Z') ||
            (character >= '0' && character <= '9') || character == '_';
   };
-  return !token.empty() && token.size() <= longestToken && std::ranges::all_of(token, mayStand);
+  return !token.empty() && token.size() <= longestHandleToken && std::ranges::all_of(token, mayStand);
 }
 
 std::string randomToken() {

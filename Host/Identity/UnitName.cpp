@@ -24,7 +24,7 @@ std::optional<unsigned> hexDigit(char character) {
 }
 
 // Unit names escape as "\x2d" whatever would have a meaning in them; the dashes that remain divide.
-std::optional<std::string> unescaped(std::string_view text) {
+std::optional<std::string> unescapedUnit(std::string_view text) {
   std::string result;
   for (std::size_t index = 0; index < text.size(); ++index) {
     if (text[index] != '\\') {
@@ -67,7 +67,7 @@ std::optional<std::string> applicationOfUnit(std::string_view unit) {
   }
   const bool hasLauncher = pieces.size() == 3;
   if (pieces.size() != 2 && !hasLauncher) return std::nullopt;
-  return unescaped(pieces.back());
+  return unescapedUnit(pieces.back());
 }
 
 }  // namespace palisade

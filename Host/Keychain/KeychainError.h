@@ -4,6 +4,7 @@
 ///
 /// Threads: an exception, thrown and caught on one thread. Ownership: a value. The text never holds a secret.
 
+#include <optional>
 #include <stdexcept>
 #include <string>
 #include <string_view>
@@ -38,5 +39,16 @@ class KeychainError : public std::runtime_error {
  private:
   KeychainErrorCode _code;
 };
+
+/// Does `work`; answers the keychain error that it ends with, or none.
+template <typename Work>
+std::optional<Error> keychainAnswer(Work work) {
+  try {
+    work();
+  } catch (const KeychainError& error) {
+    return error.error();
+  }
+  return std::nullopt;
+}
 
 }  // namespace palisade

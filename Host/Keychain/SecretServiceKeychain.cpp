@@ -76,16 +76,6 @@ GHandle<GList> search(SecretService* service, const Attributes& attributes, int 
   return items;
 }
 
-template <typename Work>
-std::optional<Error> answered(Work work) {
-  try {
-    work();
-  } catch (const KeychainError& error) {
-    return error.error();
-  }
-  return std::nullopt;
-}
-
 }  // namespace
 
 SecretServiceKeychain::SecretServiceKeychain(std::chrono::milliseconds timeLimit)
@@ -126,7 +116,7 @@ std::shared_ptr<const AccountCredential> SecretServiceKeychain::credentialForAcc
 
 std::optional<Error> SecretServiceKeychain::setCredentialForAccount(const std::shared_ptr<Account>& account,
                                                                     const std::optional<std::string>& clientID) {
-  return answered([&] {
+  return keychainAnswer([&] {
     const KeychainEntry entry = keychainEntry(account, clientID);
     const std::string during = "store " + describe(entry);
     std::string text = secretTextOfCredential(account, entry);
@@ -147,7 +137,7 @@ std::optional<Error> SecretServiceKeychain::setCredentialForAccount(const std::s
 
 std::optional<Error> SecretServiceKeychain::removeCredentialForAccount(const std::shared_ptr<Account>& account,
                                                                        const std::optional<std::string>& clientID) {
-  return answered([&] {
+  return keychainAnswer([&] {
     const KeychainEntry entry = keychainEntry(account, clientID);
     const std::string during = "remove " + describe(entry);
     _session->run(during, [&](SecretService* service, GCancellable* cancellable) {

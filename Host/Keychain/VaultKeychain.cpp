@@ -88,13 +88,8 @@ auto translated(Work work) {
 }
 
 template <typename Work>
-std::optional<Error> answered(Work work) {
-  try {
-    translated(work);
-  } catch (const KeychainError& error) {
-    return error.error();
-  }
-  return std::nullopt;
+std::optional<Error> translatedAnswer(Work work) {
+  return keychainAnswer([&] { translated(work); });
 }
 
 bool isThere(const std::filesystem::path& path) {
@@ -185,7 +180,7 @@ std::shared_ptr<const AccountCredential> VaultKeychain::credentialForAccount(con
 
 std::optional<Error> VaultKeychain::setCredentialForAccount(const std::shared_ptr<Account>& account,
                                                             const std::optional<std::string>& clientID) {
-  return answered([&] {
+  return translatedAnswer([&] {
     const KeychainEntry entry = keychainEntry(account, clientID);
     const VaultCipher::Sealed sealed = _vault->cipher.seal(secretTextOfCredential(account, entry), placeOf(entry));
     _vault->store.write([&](Database&, const Writer& writer) {
@@ -197,7 +192,7 @@ std::optional<Error> VaultKeychain::setCredentialForAccount(const std::shared_pt
 
 std::optional<Error> VaultKeychain::removeCredentialForAccount(const std::shared_ptr<Account>& account,
                                                                const std::optional<std::string>& clientID) {
-  return answered([&] {
+  return translatedAnswer([&] {
     const KeychainEntry entry = keychainEntry(account, clientID);
     _vault->store.write([&](Database&, const Writer& writer) {
       writer.remove.execute(entry.accountID, entry.clientID.has_value(), entry.clientID.value_or(""));

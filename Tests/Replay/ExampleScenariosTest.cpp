@@ -2,9 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <ostream>
 #include <string>
 #include <vector>
@@ -47,11 +44,6 @@ const Story stories[] = {
 };
 
 std::string pathOf(const std::string& story) { return SCENARIOS_FOLDER "/" + story + ".json"; }
-
-std::string contentOf(const std::filesystem::path& path) {
-  std::ifstream file(path);
-  return {std::istreambuf_iterator<char>(file), {}};
-}
 
 class AnExampleScenario : public ::testing::TestWithParam<Story> {};
 

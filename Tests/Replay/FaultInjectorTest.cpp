@@ -33,7 +33,7 @@ struct PlatformCall {
 
 void PrintTo(const PlatformCall& row, std::ostream* stream) { *stream << row.name; }
 
-const AccountType facebook{std::string(AccountTypeIdentifierFacebook)};
+const AccountType faultedType{std::string(AccountTypeIdentifierFacebook)};
 
 std::shared_ptr<const Client> someClient(FakePlatform& platform) { return platform.makeClient({.id = "photos"}); }
 std::shared_ptr<Account> someAccount(FakePlatform& platform) {
@@ -60,16 +60,16 @@ const PlatformCall platformCalls[] = {
      [](FakePlatform& platform) { platform.store->accountsWithAccountTypeIdentifier("t"); }},
     {"AccountStore.authorizationManager", [](FakePlatform& platform) { platform.store->authorizationManager(); }},
     {"AuthorizationManager.authorizationForClient",
-     [](FakePlatform& platform) { platform.authorizations.authorizationForClient(someClient(platform), facebook); }},
+     [](FakePlatform& platform) { platform.authorizations.authorizationForClient(someClient(platform), faultedType); }},
     {"AuthorizationManager.allAuthorizationsForAccountType",
-     [](FakePlatform& platform) { platform.authorizations.allAuthorizationsForAccountType(facebook); }},
+     [](FakePlatform& platform) { platform.authorizations.allAuthorizationsForAccountType(faultedType); }},
     {"AuthorizationManager.setAuthorization",
      [](FakePlatform& platform) {
        const auto client = someClient(platform);
-       platform.authorizations.setAuthorization(ClientAuthorization(client), client, facebook);
+       platform.authorizations.setAuthorization(ClientAuthorization(client), client, faultedType);
      }},
     {"AuthorizationManager.removeAllClientAuthorizationsForAccountType",
-     [](FakePlatform& platform) { platform.authorizations.removeAllClientAuthorizationsForAccountType(facebook); }},
+     [](FakePlatform& platform) { platform.authorizations.removeAllClientAuthorizationsForAccountType(faultedType); }},
     {"KeychainManager.credentialForAccount",
      [](FakePlatform& platform) { platform.keychain.credentialForAccount(someAccount(platform), std::nullopt); }},
     {"KeychainManager.setCredentialForAccount",

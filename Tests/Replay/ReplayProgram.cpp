@@ -16,11 +16,6 @@
 namespace palisade {
 namespace {
 
-std::string contentOf(const std::filesystem::path& path) {
-  std::ifstream file(path, std::ios::binary);
-  return {std::istreambuf_iterator<char>(file), {}};
-}
-
 std::string quoted(const std::string& argument) {
   std::string text = "'";
   for (const char character : argument) text += character == '\'' ? "'\\''" : std::string(1, character);
@@ -45,6 +40,11 @@ std::string outcomeOf(const Value& event) {
 }
 
 }  // namespace
+
+std::string contentOf(const std::filesystem::path& path) {
+  std::ifstream file(path, std::ios::binary);
+  return {std::istreambuf_iterator<char>(file), {}};
+}
 
 std::vector<Value> ReplayRun::results() const {
   std::vector<Value> results;

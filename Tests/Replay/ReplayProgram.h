@@ -2,6 +2,7 @@
 
 /// Runs plugin-replay as its users do and reads what it prints.
 
+#include <filesystem>
 #include <string>
 #include <vector>
 
@@ -17,6 +18,8 @@ struct ReplayRun {
   /// The printed lines, each parsed.
   std::vector<Value> results() const;
 };
+
+std::string contentOf(const std::filesystem::path& file);
 
 ReplayRun runReplay(const std::vector<std::string>& arguments, const std::string& input = "");
 

@@ -14,7 +14,7 @@ namespace {
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-const LocalizedText photos = {
+const LocalizedText photosInLanguages = {
     .untranslated = "Photos",
     .translations = {
         {"de", "Fotos"}, {"de_AT", "Fotos (AT)"}, {"pt_BR", "Fotos (BR)"}, {"sr", "Фотографије"}, {"sr@latin", "Fotografije"}}};
@@ -40,7 +40,7 @@ TEST(ALocalizedText, IsTheOneOfTheFirstLocaleThatHasOne) {
       {{"POSIX"}, "Photos"},
       {{"", "..", "@", "_"}, "Photos"},
   };
-  for (const auto& [locales, text] : cases) EXPECT_EQ(textForLocales(photos, locales), text);
+  for (const auto& [locales, text] : cases) EXPECT_EQ(textForLocales(photosInLanguages, locales), text);
 }
 
 TEST(TheUsersLocales, AreThoseOfTheFirstVariableThatSaysSomething) {

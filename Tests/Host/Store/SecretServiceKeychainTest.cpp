@@ -22,7 +22,7 @@ using testing::IsEmpty;
 using testing::Not;
 using testing::Optional;
 
-constexpr const char* canary = "EAABcanaryTokenThatMustNotCrossTheBus";
+constexpr const char* busCanary = "EAABcanaryTokenThatMustNotCrossTheBus";
 
 class TheSecretService : public testing::Test {
  protected:
@@ -83,16 +83,16 @@ TEST_F(TheSecretService, ShowsPeopleWhatItKeeps) {
 TEST_F(TheSecretService, GetsNoTokenOverTheBusUnencrypted) {
   session.startKeyring();
   session.record();
-  ASSERT_EQ(set("a", "client", {.token = canary}), std::nullopt);
-  EXPECT_THAT(get("a", "client"), Optional(CredentialContent{.token = canary}));
+  ASSERT_EQ(set("a", "client", {.token = busCanary}), std::nullopt);
+  EXPECT_THAT(get("a", "client"), Optional(CredentialContent{.token = busCanary}));
   // When this call is in the recording, so is everything before it.
   while (session.recording().find("the.end.of.the.Recording") == std::string::npos) {
     session.run({"dbus-send", "--session", "--type=signal", "/", "the.end.of.the.Recording.IsHere"});
   }
   EXPECT_THAT(session.recording(), AllOf(HasSubstr("CreateItem"), HasSubstr("GetSecrets"), HasSubstr("user of a")))
       << "the recording is of this conversation";
-  EXPECT_THAT(session.recording(), Not(HasSubstr(canary)));
-  EXPECT_THAT(filesHolding(canary, session.home()), IsEmpty());
+  EXPECT_THAT(session.recording(), Not(HasSubstr(busCanary)));
+  EXPECT_THAT(filesHolding(busCanary, session.home()), IsEmpty());
 }
 
 TEST_F(TheSecretService, KeepsOneItemForEachCredential) {

@@ -23,7 +23,7 @@ using ::testing::Not;
 using ::testing::SizeIs;
 using ::testing::StartsWith;
 
-const RecordData refused{.granted = false, .options = persistentOptions()};
+const RecordData refusedRecord{.granted = false, .options = persistentOptions()};
 const RecordData grantedEmail{.options = persistentOptions(), .permissions = PermissionSet{"email"}};
 
 const Error droppedCallback =
@@ -47,7 +47,7 @@ TEST(AServerThatAnswersTwice, IsHeardOnceByARequest) {
 TEST(AServerThatAnswersTwice, IsHeardOnceByADirectAuthorization) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(refused);
+  scene.addRecord(refusedRecord);
   scene.platform.social.authorizationAnswers = {serverGrants({"email"}, Delivery::twice)};
   EXPECT_THAT(scene.authorize(), isGrant());
   EXPECT_THAT(scene.platform.trace.named("KeychainManager.setCredentialForAccount"), SizeIs(1));
@@ -81,10 +81,10 @@ TEST(AnAnswerThatIsDropped, RefusesTheRequest) {
 TEST(AnAnswerThatIsDropped, RefusesADirectAuthorizationThatWaitsForIt) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(refused);
+  scene.addRecord(refusedRecord);
   scene.platform.social.authorizationAnswers = {{.delivery = Delivery::dropped}};
   EXPECT_THAT(scene.authorize(), isUnexpectedFailureAnswer());
-  EXPECT_EQ(scene.record(), refused);
+  EXPECT_EQ(scene.record(), refusedRecord);
 }
 
 TEST(AnAnswerThatIsDropped, RefusesAPromptThatWaitsForItsWords) {

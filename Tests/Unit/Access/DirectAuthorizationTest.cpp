@@ -7,6 +7,7 @@
 #include <gmock/gmock.h>
 
 #include "Tests/Unit/Access/EagerSocialFramework.h"
+#include "Tests/Unit/Access/OptionKeys.h"
 #include "Tests/Unit/Support/Scene.h"
 
 namespace palisade {
@@ -20,8 +21,7 @@ using ::testing::IsEmpty;
 constexpr const char* operation = "authorizeAccessToAccountsOfType:forClient:store:completion:";
 constexpr const char* strange = "This is strange behavior. We're being asked to directly authorize %@ for Facebook access.";
 
-const std::string appIDKey(FacebookAppIdKey);
-const RecordData refused{.granted = false, .options = persistentOptions(FacebookAudienceFriends)};
+const RecordData refusedForFriends{.granted = false, .options = persistentOptions(FacebookAudienceFriends)};
 
 RecordData grantedWith(std::optional<PermissionSet> permissions) {
   return {.options = persistentOptions(FacebookAudienceFriends), .permissions = std::move(permissions)};
@@ -36,7 +36,7 @@ const Dictionary audit{{"accountType", AccountTypeIdentifierFacebook},
 TEST(ADirectAuthorization, RecordsThePermissionsThatTheServerGrants) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(refused);
+  scene.addRecord(refusedForFriends);
   scene.platform.social.authorizationAnswers = {serverGrants({"user_likes", "email", "email", 7})};
 
   EXPECT_THAT(scene.authorize(), isGrant());
@@ -61,7 +61,7 @@ TEST(ADirectAuthorization, RecordsThePermissionsThatTheServerGrants) {
 TEST(ADirectAuthorization, StoresAndAnswersOnTheCallingThread) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(refused);
+  scene.addRecord(refusedForFriends);
   scene.platform.social.authorizationAnswers = {serverGrants({"email"})};
   scene.authorize();
   for (const char* event : {"AuthorizationManager.setAuthorization", "logAccessRequest", "completion"}) {
@@ -80,10 +80,10 @@ TEST(ADirectAuthorization, WritesNoLogOfItsOwnForAClientWithARecord) {
 
 TEST(ADirectAuthorization, IsRefusedWithoutAnAccount) {
   Scene scene;
-  scene.addRecord(refused);
+  scene.addRecord(refusedForFriends);
   EXPECT_THAT(scene.authorize(), isRefusalWithoutError());
   EXPECT_THAT(stepsOf(scene.platform.trace), ElementsAre("AccountStore.accountsWithAccountTypeIdentifier", "completion"));
-  EXPECT_EQ(scene.record(), refused);
+  EXPECT_EQ(scene.record(), refusedForFriends);
 }
 
 TEST(ADirectAuthorization, GrantsWithoutPermissionsWhenTheServerFails) {
@@ -109,7 +109,7 @@ TEST(ADirectAuthorization, GrantsWithoutPermissionsWhenTheServerFails) {
 TEST(ADirectAuthorization, GrantsWithoutPermissionsToAClientWithoutABundleID) {
   Scene scene({.id = "photos"});
   scene.addAccount();
-  scene.addRecord(refused);
+  scene.addRecord(refusedForFriends);
   EXPECT_THAT(scene.authorize(), isGrant());
   EXPECT_THAT(scene.platform.trace.named("FacebookAuthorizationRequest.init"), IsEmpty());
   EXPECT_EQ(scene.record(), grantedWith(PermissionSet{}));
@@ -192,7 +192,7 @@ TEST(ADirectAuthorization, ReportsTheStoresErrorAfterTheAccessRequestRecord) {
 TEST(ADirectAuthorization, TakesAnAnswerThatComesInsideTheCall) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(refused);
+  scene.addRecord(refusedForFriends);
   scene.platform.social.authorizationAnswers = {serverGrants({"email"}, Delivery::inLine)};
   EXPECT_THAT(scene.authorize(), isGrant());
   EXPECT_EQ(scene.record(), grantedWith(PermissionSet{"email"}));
@@ -205,7 +205,7 @@ TEST(ADirectAuthorization, TakesAnAnswerThatCameOnAnotherThreadBeforeTheWait) {
   services.social = &eager;
   const auto plugin = std::make_shared<PluginUnderTest>(services);
   scene.addAccount();
-  scene.addRecord(refused);
+  scene.addRecord(refusedForFriends);
   scene.platform.social.authorizationAnswers = {serverGrants({"email"})};
 
   EXPECT_THAT(scene.performHere([&](const AccessCompletion& completion) {
@@ -220,24 +220,24 @@ TEST(ADirectAuthorization, TakesAnAnswerThatCameOnAnotherThreadBeforeTheWait) {
 TEST(ADirectAuthorization, WaitsForEverForAServerThatNeverAnswers) {
   Scene& scene = *new Scene;  // The operation never returns; what it uses stays.
   scene.addAccount();
-  scene.addRecord(refused);
+  scene.addRecord(refusedForFriends);
   scene.platform.social.authorizationAnswers = {{.delivery = Delivery::never}};
   const OperationEnd end = scene.platform.run([&scene] {
     scene.plugin->authorizeAccessToAccountsOfType(scene.facebook, scene.client, scene.store, scene.platform.completion());
   });
   EXPECT_EQ(end, OperationEnd::waitsForSemaphore);
   EXPECT_THAT(scene.platform.completions(), IsEmpty());
-  EXPECT_EQ(scene.record(), refused);
+  EXPECT_EQ(scene.record(), refusedForFriends);
 }
 
 TEST(ADirectAuthorization, IsRefusedWhenTheFrameworkItselfFailedUnexpectedly) {
   for (const auto& description : {std::optional<std::string>(), std::optional<std::string>("out of file descriptors")}) {
     Scene scene;
     scene.addAccount();
-    scene.addRecord(refused);
+    scene.addRecord(refusedForFriends);
     scene.platform.social.authorizationAnswers = {{.error = accountsError(AccountsErrorUnexpectedFailure, description)}};
     EXPECT_THAT(scene.authorize(), isUnexpectedFailureAnswer());
-    EXPECT_EQ(scene.record(), refused);
+    EXPECT_EQ(scene.record(), refusedForFriends);
   }
 }
 

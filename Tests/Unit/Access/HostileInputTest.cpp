@@ -7,6 +7,7 @@
 
 #include <gmock/gmock.h>
 
+#include "Tests/Unit/Access/OptionKeys.h"
 #include "Tests/Unit/Support/Scene.h"
 
 namespace palisade {
@@ -18,10 +19,6 @@ using ::testing::ElementsAre;
 using ::testing::Field;
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
-
-const std::string appIDKey(FacebookAppIdKey);
-const std::string permissionsKey(FacebookPermissionsKey);
-const std::string audienceKey(FacebookAudienceKey);
 
 struct SceneWithAnAllowingUser : Scene {
   explicit SceneWithAnAllowingUser(FakeClientData clientData = photosClient()) : Scene(std::move(clientData)) {

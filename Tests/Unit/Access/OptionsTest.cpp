@@ -7,6 +7,7 @@
 
 #include <gmock/gmock.h>
 
+#include "Tests/Unit/Access/OptionKeys.h"
 #include "Tests/Unit/Support/Scene.h"
 
 namespace palisade {
@@ -15,10 +16,6 @@ namespace {
 using ::testing::AnyOf;
 using ::testing::IsEmpty;
 using ::testing::UnorderedElementsAre;
-
-const std::string appIDKey(FacebookAppIdKey);
-const std::string permissionsKey(FacebookPermissionsKey);
-const std::string audienceKey(FacebookAudienceKey);
 
 // One value of every type that is not a string and not an array.
 const std::vector<Value> valuesOfOtherTypes = {

@@ -18,7 +18,7 @@ using ::testing::ElementsAre;
 using ::testing::Field;
 using ::testing::IsEmpty;
 
-constexpr const char* queueLabel = "com.veltran.social.facebook.preferencesQueue";
+constexpr const char* preferencesQueue = "com.veltran.social.facebook.preferencesQueue";
 
 struct Setting {
   const char* name;
@@ -71,7 +71,7 @@ TEST(APreferenceRead, AsksForTheKeyOfTheCurrentUserOnThePreferencesQueue) {
   Scene scene;
   scene.plugin->_shouldIgnoreAccessRequest();
   const auto reads = scene.platform.trace.named("Preferences.copyValue");
-  EXPECT_THAT(reads, ElementsAre(Field(&Event::members, Dictionary{{"queue", queueLabel},
+  EXPECT_THAT(reads, ElementsAre(Field(&Event::members, Dictionary{{"queue", preferencesQueue},
                                                                    {"key", "FacebookIgnoreAccessRequests"},
                                                                    {"domain", "com.veltran.social.facebook"},
                                                                    {"user", "current"},

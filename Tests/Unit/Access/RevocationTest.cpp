@@ -6,6 +6,7 @@
 
 #include <gmock/gmock.h>
 
+#include "Tests/Unit/Access/OptionKeys.h"
 #include "Tests/Unit/Support/Scene.h"
 
 namespace palisade {
@@ -15,8 +16,8 @@ using ::testing::ElementsAre;
 using ::testing::Field;
 using ::testing::IsEmpty;
 
-constexpr const char* operation = "revokeAccessToAccountsOfType:forClient:store:completion:";
-constexpr const char* photos = "org.example.photos (Photos)";
+constexpr const char* revoking = "revokeAccessToAccountsOfType:forClient:store:completion:";
+constexpr const char* photosInLog = "org.example.photos (Photos)";
 
 const Dictionary auditOfRevocation{{"accountType", AccountTypeIdentifierFacebook},
                                    {"bundleID", "org.example.photos"},
@@ -24,13 +25,13 @@ const Dictionary auditOfRevocation{{"accountType", AccountTypeIdentifierFacebook
                                    {"userPrompted", false},
                                    {"elapsed", 0.0}};
 
-const RecordData granted{.options = persistentOptions(FacebookAudienceFriends), .permissions = PermissionSet{"email"}};
+const RecordData grantedToFriends{.options = persistentOptions(FacebookAudienceFriends), .permissions = PermissionSet{"email"}};
 const RecordData cleared{.granted = false, .options = persistentOptions(FacebookAudienceFriends)};
 
 TEST(ARevocation, InvalidatesTheTokenRemovesTheCredentialAndClearsTheRecord) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(granted);
+  scene.addRecord(grantedToFriends);
   scene.platform.keychain.addCredential("me", "org.example.photos", "client token");
 
   EXPECT_THAT(scene.revoke(), isGrant());
@@ -56,13 +57,13 @@ TEST(ARevocation, InvalidatesTheTokenRemovesTheCredentialAndClearsTheRecord) {
 TEST(ARevocation, TellsTheLogWhatItDoes) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(granted);
+  scene.addRecord(grantedToFriends);
   scene.revoke();
   EXPECT_THAT(
       logLines(scene.platform.trace),
-      ElementsAre(LogLine{7, operation, "Found Facebook app ID: %@ for client: %@", {photosAppID, photos}, "appID, client"},
-                  LogLine{7, operation, "Contacting vantad to invalidate token for client: %@", {photos}, "client"},
-                  LogLine{7, operation, "Removing credential from keychain for client: %@", {photos}, "client"}));
+      ElementsAre(LogLine{7, revoking, "Found Facebook app ID: %@ for client: %@", {photosAppID, photosInLog}, "appID, client"},
+                  LogLine{7, revoking, "Contacting vantad to invalidate token for client: %@", {photosInLog}, "client"},
+                  LogLine{7, revoking, "Removing credential from keychain for client: %@", {photosInLog}, "client"}));
 }
 
 TEST(ARevocation, OfARefusedClientIsHandledLikeAnyOther) {
@@ -76,16 +77,16 @@ TEST(ARevocation, OfARefusedClientIsHandledLikeAnyOther) {
 
 TEST(ARevocation, LooksUpNoRecordWithoutAnAccount) {
   Scene scene;
-  scene.addRecord(granted);
+  scene.addRecord(grantedToFriends);
   EXPECT_THAT(scene.revoke(), isGrant());
   EXPECT_THAT(stepsOf(scene.platform.trace), ElementsAre("AccountStore.accountsWithAccountTypeIdentifier", "completion"));
-  EXPECT_EQ(scene.record(), granted);
+  EXPECT_EQ(scene.record(), grantedToFriends);
 }
 
 TEST(ARevocation, IgnoresAClientWithoutARecord) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(granted, scene.platform.makeClient({.id = "another client"}));
+  scene.addRecord(grantedToFriends, scene.platform.makeClient({.id = "another client"}));
 
   EXPECT_THAT(scene.revoke(), isGrant());
 
@@ -93,9 +94,10 @@ TEST(ARevocation, IgnoresAClientWithoutARecord) {
               ElementsAre("AccountStore.accountsWithAccountTypeIdentifier", "Account.setAccountType",
                           "AuthorizationManager.authorizationForClient",
                           "\"Client %@ does not have an exiting ClientAuthorization. Ignoring...\"", "completion"));
-  EXPECT_THAT(logLines(scene.platform.trace),
-              ElementsAre(LogLine{
-                  7, operation, "Client %@ does not have an exiting ClientAuthorization. Ignoring...", {photos}, "client"}));
+  EXPECT_THAT(
+      logLines(scene.platform.trace),
+      ElementsAre(LogLine{
+          7, revoking, "Client %@ does not have an exiting ClientAuthorization. Ignoring...", {photosInLog}, "client"}));
 }
 
 struct StoredAppID {
@@ -122,13 +124,11 @@ TEST_P(ARecordWithoutAUsableAppID, IsClearedWithoutTouchingTokenOrCredential) {
                           "AuthorizationManager.setAuthorization", "logAccessRequest", "completion"));
   EXPECT_THAT(logLines(scene.platform.trace),
               ElementsAre(LogLine{
-                  7, operation, "Found Facebook app ID: %@ for client: %@", {GetParam().logged, photos}, "appID, client"}));
+                  7, revoking, "Found Facebook app ID: %@ for client: %@", {GetParam().logged, photosInLog}, "appID, client"}));
   EXPECT_THAT(scene.platform.trace.named("logAccessRequest"), ElementsAre(Field(&Event::members, auditOfRevocation)));
   EXPECT_EQ(scene.record(), (RecordData{.granted = false, .options = GetParam().options}));
   EXPECT_NE(scene.platform.keychain.entry("me", "org.example.photos"), nullptr);
 }
-
-const std::string appIDKey(FacebookAppIdKey);
 
 INSTANTIATE_TEST_SUITE_P(, ARecordWithoutAUsableAppID,
                          ::testing::Values(StoredAppID{"NoOptions", std::nullopt, "(null)"},
@@ -151,14 +151,14 @@ TEST(ARecordWithAnEmptyAppID, HasAnAppID) {
 TEST(ARevocation, SaysThatItWasHandledAlsoWhenStoreAndKeychainRefuse) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(granted);
+  scene.addRecord(grantedToFriends);
   scene.authorizations.answerWrites({Error{.domain = "store", .code = 1}});
   scene.platform.keychain.refuseRemovals(Error{.domain = "keychain", .code = 2});
 
   EXPECT_THAT(scene.revoke(), isGrant());
 
   EXPECT_THAT(scene.platform.trace.named("logAccessRequest"), ElementsAre(Field(&Event::members, auditOfRevocation)));
-  EXPECT_EQ(scene.record(), granted);
+  EXPECT_EQ(scene.record(), grantedToFriends);
 }
 
 TEST(ARevocation, LeavesOtherClientsAndOtherAccountsAlone) {
@@ -166,8 +166,8 @@ TEST(ARevocation, LeavesOtherClientsAndOtherAccountsAlone) {
   scene.addAccount("first");
   scene.addAccount("second");
   const auto other = scene.platform.makeClient({.id = "other", .bundleID = "org.example.other"});
-  scene.addRecord(granted);
-  scene.addRecord(granted, other);
+  scene.addRecord(grantedToFriends);
+  scene.addRecord(grantedToFriends, other);
   for (const char* account : {"first", "second"}) {
     for (const char* bundleID : {"org.example.photos", "org.example.other"}) {
       scene.platform.keychain.addCredential(account, bundleID, "client token");
@@ -185,7 +185,7 @@ TEST(ARevocation, LeavesOtherClientsAndOtherAccountsAlone) {
 TEST(ARevokedClient, IsRefusedWhenItAsksAgain) {
   Scene scene;
   scene.addAccount();
-  scene.addRecord(granted);
+  scene.addRecord(grantedToFriends);
   scene.platform.alert.answers = {userAllows()};
   EXPECT_THAT(scene.revoke(), isGrant());
   EXPECT_THAT(scene.requestAccess(optionsAskingFor({"email"})), isRefusalWithoutError());

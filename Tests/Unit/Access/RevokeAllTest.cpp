@@ -15,7 +15,7 @@ using ::testing::Field;
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
 
-constexpr const char* operation = "revokeAllAccessToAccountsOfType:store:withCompletion:";
+constexpr const char* revokingAll = "revokeAllAccessToAccountsOfType:store:withCompletion:";
 constexpr const char* found = "Found %d authorized clients. Revoking all...";
 constexpr const char* foundAppID = "Found Facebook app ID: %@ for client: %@";
 constexpr const char* contacting = "Contacting vantad to invalidate token for client: %@";
@@ -78,14 +78,14 @@ TEST_F(RevokingAll, TellsTheLogEachClientAndItsBundle) {
 
   _scene.revokeAll();
 
-  EXPECT_THAT(logLines(_trace), ElementsAre(LogLine{7, operation, found, {"3"}, "clientAuthorizations.count"},
-                                            LogLine{7, operation, foundAppID, {"app a", "client a"}, "appID, client"},
-                                            LogLine{7, operation, contacting, {"client a"}, "client"},
-                                            LogLine{7, operation, removing, {"org.example.a"}, "client.bundleID"},
-                                            LogLine{7, operation, foundAppID, {"7", "client b"}, "appID, client"},
-                                            LogLine{7, operation, foundAppID, {"", "client c"}, "appID, client"},
-                                            LogLine{7, operation, contacting, {"client c"}, "client"},
-                                            LogLine{7, operation, removing, {"org.example.c"}, "client.bundleID"}));
+  EXPECT_THAT(logLines(_trace), ElementsAre(LogLine{7, revokingAll, found, {"3"}, "clientAuthorizations.count"},
+                                            LogLine{7, revokingAll, foundAppID, {"app a", "client a"}, "appID, client"},
+                                            LogLine{7, revokingAll, contacting, {"client a"}, "client"},
+                                            LogLine{7, revokingAll, removing, {"org.example.a"}, "client.bundleID"},
+                                            LogLine{7, revokingAll, foundAppID, {"7", "client b"}, "appID, client"},
+                                            LogLine{7, revokingAll, foundAppID, {"", "client c"}, "appID, client"},
+                                            LogLine{7, revokingAll, contacting, {"client c"}, "client"},
+                                            LogLine{7, revokingAll, removing, {"org.example.c"}, "client.bundleID"}));
 }
 
 TEST_F(RevokingAll, WithoutRecordsStillMakesASessionAndRemovesAll) {
@@ -97,7 +97,7 @@ TEST_F(RevokingAll, WithoutRecordsStillMakesASessionAndRemovesAll) {
               ElementsAre("AccountStore.accountsWithAccountTypeIdentifier", "Account.setAccountType",
                           "AuthorizationManager.allAuthorizationsForAccountType", quoted(found), "FacebookSession.create",
                           "AuthorizationManager.removeAllClientAuthorizationsForAccountType", "completion"));
-  EXPECT_THAT(logLines(_trace), ElementsAre(LogLine{7, operation, found, {"0"}, "clientAuthorizations.count"}));
+  EXPECT_THAT(logLines(_trace), ElementsAre(LogLine{7, revokingAll, found, {"0"}, "clientAuthorizations.count"}));
 }
 
 TEST_F(RevokingAll, WithoutAnAccountChangesNothing) {
@@ -107,7 +107,7 @@ TEST_F(RevokingAll, WithoutAnAccountChangesNothing) {
 
   EXPECT_THAT(stepsOf(_trace), ElementsAre("AccountStore.accountsWithAccountTypeIdentifier",
                                            quoted("No Facebook account. What?"), "completion"));
-  EXPECT_THAT(logLines(_trace), ElementsAre(LogLine{3, operation, "No Facebook account. What?"}));
+  EXPECT_THAT(logLines(_trace), ElementsAre(LogLine{3, revokingAll, "No Facebook account. What?"}));
   EXPECT_EQ(storedRecords(), 1U);
 }
 

@@ -13,7 +13,7 @@ using ::testing::IsEmpty;
 using ::testing::Optional;
 using ::testing::SizeIs;
 
-constexpr const char* exchange = "_getServerAuthorizationForClient:withAppID:permissions:audience:account:completion:";
+constexpr const char* answeredOperation = "_getServerAuthorizationForClient:withAppID:permissions:audience:account:completion:";
 
 Error noToken(const std::string& reason) {
   return accountsError(7, "The Facebook server could not fulfill this access request: " + reason);
@@ -21,7 +21,7 @@ Error noToken(const std::string& reason) {
 
 LogLine response(std::string rendered) {
   return {.level = 7,
-          .operation = exchange,
+          .operation = answeredOperation,
           .format = "Access request response: %@",
           .arguments = {std::move(rendered)},
           .argumentNames = "response"};
@@ -168,7 +168,7 @@ TEST_F(AnAnswer, ThatIsNotJsonIsARefusalWithTheParsersError) {
     EXPECT_EQ(answers.front().error->domain, JsonErrorDomain);
     EXPECT_THAT(logLines(platform.trace),
                 ElementsAre(LogLine{.level = 3,
-                                    .operation = exchange,
+                                    .operation = answeredOperation,
                                     .format = "VXFacebookAccountAccessPlugin could not parse server response: %@.",
                                     .arguments = {describe(*answers.front().error)},
                                     .argumentNames = "error"}));
