@@ -15,6 +15,7 @@
 #include <functional>
 #include <memory>
 #include <optional>
+#include <span>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -127,7 +128,8 @@ class SqliteAccountStore final : public AccountStore, public AuthorizationManage
 
   /// \name History
   ///@{
-  std::optional<Error> appendToHistory(const AccessRequestRecord& record, Date at);
+  /// All of them, in this order, or none.
+  std::optional<Error> appendToHistory(std::span<const HistoryEntry> entries);
 
   /// Newest first: in the order of appending, whatever the clock said.
   std::vector<HistoryEntry> history(const HistoryFilter& filter);

@@ -1,26 +1,27 @@
 #include "Host/Accounts/SqliteAccountStore.h"
 
-// The history of the clients' requests. It grows by one entry a request and loses its oldest entries, one for each that comes
-// in, once it is full.
+// The history of the clients' requests. It grows by one entry a request and, once it is full, loses as many of its oldest ones
+// as come in.
 
 #include "Host/Accounts/SqliteAccountStoreStatements.h"
 #include "Host/Sqlite/Transaction.h"
 
 namespace palisade {
 
-std::optional<Error> SqliteAccountStore::appendToHistory(const AccessRequestRecord& record, Date at) {
+std::optional<Error> SqliteAccountStore::appendToHistory(std::span<const HistoryEntry> entries) {
   try {
     _connections->write([&](Database& database, const AccountStoreWriter& writer) {
       Transaction transaction(database);
-      {
+      std::int64_t last = 0;
+      for (const HistoryEntry& entry : entries) {
         Statement::Run row =
-            writer.appendToHistory.run(at.time_since_epoch().count(), record.accountTypeIdentifier, record.bundleID,
-                                       record.granted, record.userPrompted, record.elapsedSeconds);
+            writer.appendToHistory.run(entry.at.time_since_epoch().count(), entry.accountTypeIdentifier, entry.bundleID,
+                                       entry.granted, entry.userPrompted, entry.elapsedSeconds);
         row.next();
-        const std::int64_t position = row.integer(0);
+        last = row.integer(0);
         row.next();
-        writer.trimHistory.execute(position - historyCapacity);
       }
+      writer.trimHistory.execute(last - historyCapacity);
       transaction.commit();
     });
   } catch (const SqliteError& error) {

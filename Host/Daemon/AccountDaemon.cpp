@@ -4,6 +4,7 @@
 #include <chrono>
 #include <cstdlib>
 
+#include "Host/Accounts/AccessHistory.h"
 #include "Host/Accounts/ClientDirectory.h"
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Alert/TerminalAlert.h"
@@ -73,7 +74,8 @@ struct AccountDaemon::Parts {
         directory(clients),
         store({.path = stateFolder() / "accounts.sqlite", .onChange = [this](const StoreChange& change) { announce(change); }},
               directory),
-        log(configuration.logLevel, [this](const AccessRequestRecord& record) { store.appendToHistory(record, now()); }),
+        log(configuration.logLevel, [this](const AccessRequestRecord& record) { history.append(record, now()); }),
+        history(store, [this](const Error& error) { tell(error.description.value_or("The history cannot be written.")); }),
         keychain(openKeychain({.choice = configuration.keychain,
                                .vault = {.path = stateFolder() / "vault.sqlite",
                                          .keyFile = stateFolder() / "vault.key",
@@ -87,6 +89,7 @@ struct AccountDaemon::Parts {
         terminal(configuration.terminal.value_or("")),
         alert(terminal, TerminalAlert::takeDown),
         service({.store = store,
+                 .history = history,
                  .keychain = *keychain,
                  .clients = clients,
                  .preferences = preferences,
@@ -169,6 +172,7 @@ struct AccountDaemon::Parts {
   Directory directory;
   SqliteAccountStore store;
   JournalLog log;
+  AccessHistory history;
   std::unique_ptr<Keychain> keychain;
   Outbox outbox;
   ServerConfiguration server;

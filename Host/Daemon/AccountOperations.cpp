@@ -260,7 +260,7 @@ void AccountOperations::manage(const std::string& accountType, const PluginCall&
 Rows AccountOperations::history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) {
   refuseUnlessManager(caller);
   Rows rows;
-  for (const HistoryEntry& entry : _parts.store.history({.limit = limit, .bundleID = client})) {
+  for (const HistoryEntry& entry : _parts.history.entries({.limit = limit, .bundleID = client})) {
     rows.push_back({{"time", unixTime(entry.at)},
                     {"account_type", entry.accountTypeIdentifier},
                     {"client", textOrNull(entry.bundleID)},

@@ -13,6 +13,7 @@
 #include <string>
 #include <vector>
 
+#include "Host/Accounts/AccessHistory.h"
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Bus/AccountsService.h"
 #include "Host/Daemon/ClientLanes.h"
@@ -31,6 +32,7 @@ class AccountOperations final : public AccountsService {
 
   struct Parts {
     SqliteAccountStore& store;
+    AccessHistory& history;
     Keychain& keychain;
     const ClientRegistry& clients;
     TomlPreferencesStore& preferences;

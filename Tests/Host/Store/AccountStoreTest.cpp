@@ -245,12 +245,13 @@ INSTANTIATE_TEST_SUITE_P(Kinds, AnOptionThatCannotBeKept,
 class History : public AccountStoreFixture {
  protected:
   std::optional<Error> append(const std::string& client, int second) {
-    return store->appendToHistory({.accountTypeIdentifier = facebookType.identifier(),
-                                   .bundleID = client,
-                                   .granted = true,
-                                   .userPrompted = true,
-                                   .elapsedSeconds = 0.5},
-                                  Date(std::chrono::seconds(second)));
+    const HistoryEntry entry{.at = Date(std::chrono::seconds(second)),
+                             .accountTypeIdentifier = facebookType.identifier(),
+                             .bundleID = client,
+                             .granted = true,
+                             .userPrompted = true,
+                             .elapsedSeconds = 0.5};
+    return store->appendToHistory({&entry, 1});
   }
 
   std::vector<int> seconds(const HistoryFilter& filter) {
@@ -263,12 +264,13 @@ class History : public AccountStoreFixture {
 };
 
 TEST_F(History, KeepsEveryField) {
-  store->appendToHistory({.accountTypeIdentifier = "type",
-                          .bundleID = std::nullopt,
-                          .granted = false,
-                          .userPrompted = true,
-                          .elapsedSeconds = 1.25},
-                         Date(std::chrono::seconds(-5)));
+  const HistoryEntry entry{.at = Date(std::chrono::seconds(-5)),
+                           .accountTypeIdentifier = "type",
+                           .bundleID = std::nullopt,
+                           .granted = false,
+                           .userPrompted = true,
+                           .elapsedSeconds = 1.25};
+  store->appendToHistory({&entry, 1});
   restart();
   const auto entries = store->history({});
   ASSERT_THAT(entries, SizeIs(1));

@@ -21,6 +21,10 @@ namespace {
 using testing::Optional;
 using testing::SizeIs;
 
+std::vector<HistoryEntry> oneEntry(const std::string& accountType) {
+  return {{.at = Date(), .accountTypeIdentifier = accountType, .bundleID = "bundle"}};
+}
+
 class ABusyStore : InMemory, public AccountStoreFixture {
  protected:
   // Runs SQL on the closed store, in one change.
@@ -76,7 +80,7 @@ TEST_F(ABusyStore, GivesEveryThreadWholeRecordsAndKeepsTheLast) {
         for (int round = 0; round <= rounds; ++round) {
           EXPECT_EQ(set("client " + std::to_string(writer), grantNumber(round)), std::nullopt);
           EXPECT_EQ(get("client " + std::to_string(writer)), grantNumber(round)) << "a thread reads what it wrote";
-          store->appendToHistory({.accountTypeIdentifier = "type", .bundleID = "bundle"}, Date());
+          store->appendToHistory(oneEntry("type"));
         }
       });
     }
@@ -108,7 +112,7 @@ TEST_F(ABusyStore, KeepsTheNewestOfALongHistory) {
     INSERT INTO history (at, account_type, granted, user_prompted, elapsed_seconds)
     SELECT number, 'type', 1, 1, 0.0 FROM numbers)sql");
   restart();
-  store->appendToHistory({.accountTypeIdentifier = "newest", .bundleID = "bundle"}, Date());
+  store->appendToHistory(oneEntry("newest"));
   const auto history = store->history({.limit = 200'000});
   ASSERT_THAT(history, SizeIs(static_cast<std::size_t>(SqliteAccountStore::historyCapacity)));
   EXPECT_EQ(history.front().accountTypeIdentifier, "newest");
