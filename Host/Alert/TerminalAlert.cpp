@@ -15,30 +15,16 @@
 #include <utility>
 
 #include "Host/Alert/TerminalDialog.h"
+#include "Host/Identity/FileDescriptor.h"
 
 namespace palisade {
 namespace {
 
 using Clock = std::chrono::steady_clock;
 
-class FileDescriptor {
- public:
-  explicit FileDescriptor(int descriptor) : _descriptor(descriptor) {}
-  FileDescriptor(FileDescriptor&& other) noexcept : _descriptor(std::exchange(other._descriptor, -1)) {}
-  FileDescriptor& operator=(FileDescriptor&&) = delete;
-  ~FileDescriptor() {
-    if (_descriptor >= 0) close(_descriptor);
-  }
-  int get() const { return _descriptor; }
-  bool isOpen() const { return _descriptor >= 0; }
-
- private:
-  int _descriptor;
-};
-
 FileDescriptor openTerminal(const std::string& path) {
   FileDescriptor terminal(open(path.c_str(), O_RDWR | O_CLOEXEC | O_NOCTTY));
-  if (terminal.isOpen() && isatty(terminal.get()) != 1) return FileDescriptor(-1);
+  if (terminal.isOpen() && isatty(terminal.number()) != 1) return FileDescriptor(-1);
   return terminal;
 }
 
@@ -95,18 +81,18 @@ class TerminalAlertHandle final : public AlertHandle {
       : _terminal(std::move(terminal)),
         _takenDown(std::move(takenDown)),
         _description(std::move(description)) {
-    tcgetattr(_terminal.get(), &_earlierSettings);
+    tcgetattr(_terminal.number(), &_earlierSettings);
     termios keys = _earlierSettings;
     cfmakeraw(&keys);
     // What was typed before the alert stood there was meant for something else.
-    tcsetattr(_terminal.get(), TCSAFLUSH, &keys);
-    writeAll(_terminal.get(), "\r\n");
+    tcsetattr(_terminal.number(), TCSAFLUSH, &keys);
+    writeAll(_terminal.number(), "\r\n");
     draw();
   }
 
-  ~TerminalAlertHandle() override { tcsetattr(_terminal.get(), TCSAFLUSH, &_earlierSettings); }
+  ~TerminalAlertHandle() override { tcsetattr(_terminal.number(), TCSAFLUSH, &_earlierSettings); }
 
-  void takeDown() const { eventfd_write(_takenDown.get(), 1); }
+  void takeDown() const { eventfd_write(_takenDown.number(), 1); }
 
   AlertResponse waitForAnswer(std::chrono::milliseconds armedAfter, Clock::time_point deadline) {
     Clock::time_point armedAt = Clock::now() + armedAfter;
@@ -135,27 +121,27 @@ class TerminalAlertHandle final : public AlertHandle {
 
  private:
   void draw() {
-    const std::string dialog = drawDialog(_description, _selected, columnsOfTerminal(_terminal.get()));
+    const std::string dialog = drawDialog(_description, _selected, columnsOfTerminal(_terminal.number()));
     _drawnLines = static_cast<std::size_t>(std::ranges::count(dialog, '\n'));
-    writeAll(_terminal.get(), dialog);
+    writeAll(_terminal.number(), dialog);
   }
 
   void select(DialogButton button) {
     _selected = button;
-    writeAll(_terminal.get(), "\x1b[" + std::to_string(_drawnLines) + "A\r\x1b[J");
+    writeAll(_terminal.number(), "\x1b[" + std::to_string(_drawnLines) + "A\r\x1b[J");
     draw();
   }
 
   // Waits for keys; 0 when there will be no answer: taken down, out of time, or the terminal is gone.
   std::size_t readKeys(std::span<char> buffer, Clock::time_point deadline) const {
     while (true) {
-      pollfd sources[] = {{.fd = _terminal.get(), .events = POLLIN, .revents = 0},
-                          {.fd = _takenDown.get(), .events = POLLIN, .revents = 0}};
+      pollfd sources[] = {{.fd = _terminal.number(), .events = POLLIN, .revents = 0},
+                          {.fd = _takenDown.number(), .events = POLLIN, .revents = 0}};
       const int ready = poll(sources, std::size(sources), millisecondsUntil(deadline));
       if (ready < 0 && errno == EINTR) continue;
       if (ready <= 0 || sources[1].revents != 0) return 0;
 
-      const ssize_t length = read(_terminal.get(), buffer.data(), buffer.size());
+      const ssize_t length = read(_terminal.number(), buffer.data(), buffer.size());
       if (length < 0 && errno == EINTR) continue;
       return length > 0 ? static_cast<std::size_t>(length) : 0;
     }
