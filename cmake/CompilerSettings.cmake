@@ -27,6 +27,10 @@ include_directories(${PROJECT_SOURCE_DIR})
 add_compile_options(
   -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor -Wold-style-cast -Woverloaded-virtual
   -fmacro-prefix-map=${PROJECT_SOURCE_DIR}/= -fstack-protector-strong)
+# GCC 12 sees overlapping copies in joined std::strings that cannot overlap: https://gcc.gnu.org/PR105651.
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_LESS 13)
+  add_compile_options(-Wno-restrict)
+endif()
 add_compile_definitions($<$<CONFIG:Debug>:_GLIBCXX_ASSERTIONS>)
 add_link_options(-Wl,--as-needed -Wl,-z,relro -Wl,-z,now)
 

@@ -1,0 +1,29 @@
+#pragma once
+
+/// The calls that are measured, each as a client makes it: with sd-bus, and blocking.
+///
+/// Threads: any, each with a bus connection of its own. Errors: `BusCallError`, also for an answer that is not the one that the
+/// measurement is about.
+
+#include "Benchmarks/Daemon/BusLoad.h"
+
+namespace palisade {
+
+/// The bare echo of a message as large as a request for access.
+void callEcho(sd_bus& bus);
+
+/// A request that an earlier grant answers.
+void requestGrantedAccess(sd_bus& bus);
+
+/// A request that somebody has to be asked about; returns when the outcome is known, and that has to be a grant.
+void requestAccessAndWait(sd_bus& bus);
+
+void readCredential(sd_bus& bus);
+void revokeOwnGrant(sd_bus& bus);
+
+/// Peers: another service's look-up of a stored decision, and of an authorization.
+void preparePermissionStore(sd_bus& bus);
+void lookUpPermission(sd_bus& bus);
+void checkAuthorization(sd_bus& bus);
+
+}  // namespace palisade

@@ -1,0 +1,226 @@
+// Measures the account daemon beside the least that a call over the same bus can cost. Runs inside a session of Tools/Trial.
+
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <exception>
+#include <filesystem>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "Benchmarks/Daemon/AccountsCalls.h"
+#include "Benchmarks/Daemon/BusLoad.h"
+#include "Benchmarks/Daemon/MeasuredDaemon.h"
+#include "Host/Accounts/AccountStoreSchema.h"
+#include "Host/Sqlite/Database.h"
+#include "Host/Sqlite/Transaction.h"
+
+namespace palisade {
+namespace {
+
+constexpr int rounds = 5;
+constexpr std::chrono::milliseconds roundLength{400};
+constexpr const char* daemonProgram = "accountd";
+constexpr const char* answeringDaemonProgram = "palisade-answering-accountd";
+
+using Clock = std::chrono::steady_clock;
+
+double median(std::vector<double> values) {
+  std::ranges::sort(values);
+  return values[values.size() / 2];
+}
+
+struct Measurement {
+  std::vector<Load> loads;
+
+  double of(double Load::*figure) const {
+    std::vector<double> values;
+    for (const Load& load : loads) values.push_back(load.*figure);
+    return median(values);
+  }
+};
+
+struct Measured {
+  const char* name;
+  BusCall call;
+  pid_t server;
+  /// Times the echo, for the call and for the server's processor; 0 is no goal.
+  double goal;
+  double processorGoal;
+};
+
+std::string verdict(double figure, double goal) {
+  char text[64] = "";
+  if (goal > 0) std::snprintf(text, sizeof text, "at most %.1f: %s", goal, figure <= goal ? "met" : "missed");
+  return text;
+}
+
+// Every call in turn, round by round, so that whatever else the machine does meets all of them.
+void measureSideBySide(const std::vector<Measured>& all, int clients) {
+  std::vector<Measurement> measurements(all.size());
+  for (int round = 0; round < rounds; ++round) {
+    for (std::size_t index = 0; index < all.size(); ++index) {
+      measurements[index].loads.push_back(measureLoad(all[index].call, clients, roundLength, all[index].server));
+    }
+  }
+  std::printf("\n%-34s %8s %8s %8s   %-20s %10s %8s   %s\n",
+              (std::to_string(clients) + (clients == 1 ? " client" : " clients")).c_str(), "median", "x echo", "p99", "goal",
+              "cpu a call", "x echo", "goal");
+  for (std::size_t index = 0; index < all.size(); ++index) {
+    const Measurement& own = measurements[index];
+    const auto timesEcho = [&](double Load::*figure) { return own.of(figure) / measurements.front().of(figure); };
+    std::printf(
+        "%-34s %5.0f us %8.2f %5.0f us   %-20s %7.1f us %8.2f   %s\n", all[index].name, own.of(&Load::medianMicroseconds),
+        timesEcho(&Load::medianMicroseconds), own.of(&Load::slowestHundredthMicroseconds),
+        verdict(timesEcho(&Load::medianMicroseconds), all[index].goal).c_str(), own.of(&Load::serverMicroseconds),
+        timesEcho(&Load::serverMicroseconds), verdict(timesEcho(&Load::serverMicroseconds), all[index].processorGoal).c_str());
+  }
+  std::fflush(stdout);
+}
+
+void addPeer(std::vector<Measured>& all, sd_bus& bus, const char* name, const char* service, const BusCall& prepare,
+             const BusCall& call) {
+  try {
+    prepare(bus);
+    all.push_back({.name = name, .call = call, .server = processOwning(bus, service), .goal = 0, .processorGoal = 0});
+  } catch (const BusCallError& error) {
+    std::printf("Not measured: %s (%s)\n", name, error.what());
+  }
+}
+
+void measureCalls(const MeasuredDaemon& daemon) {
+  const Bus bus = openBus();
+  std::vector<Measured> all = {
+      {.name = "echo", .call = callEcho, .server = processOwning(*bus, "com.veltran.Echo1"), .goal = 0, .processorGoal = 0},
+      {.name = "request, from an earlier grant",
+       .call = requestGrantedAccess,
+       .server = daemon.process(),
+       .goal = 1.3,
+       .processorGoal = 2},
+      {.name = "credential", .call = readCredential, .server = daemon.process(), .goal = 1.4, .processorGoal = 0},
+  };
+  addPeer(all, *bus, "peer: xdg-permission-store, Lookup", "org.freedesktop.impl.portal.PermissionStore",
+          preparePermissionStore, lookUpPermission);
+  addPeer(all, *bus, "peer: polkit, CheckAuthorization", "org.freedesktop.PolicyKit1", checkAuthorization, checkAuthorization);
+  for (const int clients : {1, 4, 16}) measureSideBySide(all, clients);
+}
+
+void measureMemory(const MeasuredDaemon& daemon) {
+  const double atRest = proportionalMegabytes(daemon.process());
+  double calls = 0;
+  while (calls < 100'000) {
+    constexpr std::chrono::seconds length{1};
+    calls += measureLoad(requestGrantedAccess, 4, length, daemon.process()).callsPerSecond;
+  }
+  const double afterwards = proportionalMegabytes(daemon.process());
+  std::printf("\n%-34s %5.1f MB   %s\n", "memory at rest", atRest, atRest <= 8 ? "at most 8: met" : "at most 8: missed");
+  std::printf("%-34s %5.1f MB   %s\n", "memory after 100,000 calls", afterwards,
+              afterwards <= atRest * 1.1 + 0.5 ? "flat: met" : "flat: missed");
+  std::fflush(stdout);
+}
+
+void measureStart() {
+  std::vector<double> milliseconds;
+  for (int start = 0; start < 11; ++start) {
+    const Bus bus = openBus();
+    const auto begin = Clock::now();
+    const MeasuredDaemon daemon(daemonProgram);
+    requestGrantedAccess(*bus);
+    milliseconds.push_back(std::chrono::duration<double, std::milli>(Clock::now() - begin).count());
+  }
+  const double figure = median(milliseconds);
+  std::printf("\n%-34s %5.1f ms   %s\n", "start to first answer", figure,
+              figure <= 15 ? "at most 15: met" : "at most 15: missed");
+  std::fflush(stdout);
+}
+
+void fillStore(int grants) {
+  const auto database =
+      Database::open({.path = std::filesystem::path(std::getenv("XDG_STATE_HOME")) / "palisade/accounts.sqlite",
+                      .applicationID = accountStoreApplicationID,
+                      .migrations = accountStoreMigrations});
+  Transaction transaction(*database);
+  const std::string sql =
+      "WITH RECURSIVE numbers (number) AS (SELECT 1 UNION ALL SELECT number + 1 FROM numbers WHERE number < " +
+      std::to_string(grants) +
+      ") INSERT OR IGNORE INTO authorizations (account_type, client_id, app_name, granted, answered_by_nobody, updated_at, "
+      "digest)"
+      " SELECT 'com.veltran.accounttype.facebook', 'org.example.other' || number, 'Other', 1, 0, 0, 0 FROM numbers";
+  database->execute("fill the store", sql.c_str());
+  transaction.commit();
+}
+
+void measureManyGrants() {
+  std::vector<double> medians;
+  std::vector<double> processor;
+  for (const int grants : {1'000, 1'000'000}) {
+    fillStore(grants);
+    const MeasuredDaemon daemon(daemonProgram);
+    Measurement measurement;
+    for (int round = 0; round < rounds; ++round) {
+      measurement.loads.push_back(measureLoad(requestGrantedAccess, 1, roundLength, daemon.process()));
+    }
+    medians.push_back(measurement.of(&Load::medianMicroseconds));
+    processor.push_back(measurement.of(&Load::serverMicroseconds));
+  }
+  const double times = medians[1] / medians[0];
+  std::printf("\nrequest among 1,000 grants %.0f us (cpu %.1f us), among 1,000,000 %.0f us (cpu %.1f us), %.2f times: %s\n",
+              medians[0], processor[0], medians[1], processor[1], times, verdict(times, 1.5).c_str());
+  std::fflush(stdout);
+}
+
+// The alert is answered by the daemon itself, which is a program of the benchmarks; everything else is the product's.
+void measureApproval() {
+  const MeasuredDaemon daemon(answeringDaemonProgram);
+  const Bus bus = openBus();
+  std::vector<double> approvals;
+  std::vector<double> echoes;
+  for (int round = 0; round < 50; ++round) {
+    revokeOwnGrant(*bus);
+    auto start = Clock::now();
+    requestAccessAndWait(*bus);
+    approvals.push_back(std::chrono::duration<double, std::micro>(Clock::now() - start).count());
+    start = Clock::now();
+    callEcho(*bus);
+    echoes.push_back(std::chrono::duration<double, std::micro>(Clock::now() - start).count());
+  }
+  const double times = median(approvals) / median(echoes);
+  std::printf("\nfull approval, token over HTTPS, durable grant: %.0f us, %.1f times the echo between them (%.0f us): %s\n",
+              median(approvals), times, median(echoes), verdict(times, 6).c_str());
+  std::fflush(stdout);
+}
+
+void measureAll() {
+  const Bus bus = openBus();
+  requestAccessAndWait(*bus);
+  stopDaemon(processOwning(*bus, "com.veltran.Accounts1"));
+  measureStart();
+  {
+    const MeasuredDaemon daemon(daemonProgram);
+    requestGrantedAccess(*bus);
+    measureCalls(daemon);
+  }
+  {
+    const MeasuredDaemon daemon(daemonProgram);
+    requestGrantedAccess(*bus);
+    measureMemory(daemon);
+  }
+  measureApproval();
+  measureManyGrants();
+}
+
+}  // namespace
+}  // namespace palisade
+
+int main() {
+  try {
+    palisade::measureAll();
+  } catch (const std::exception& error) {
+    std::fprintf(stderr, "The daemon's measurements ended early: %s\n", error.what());
+    return 1;
+  }
+}
