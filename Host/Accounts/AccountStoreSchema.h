@@ -14,7 +14,7 @@ inline constexpr std::int32_t accountStoreApplicationID = 0x506c4163;
 
 /// `position` and `id` count up and give the store's order. Options and permissions are JSON; NULL is none. `digest` tells a
 /// damaged record from a good one.
-inline constexpr std::array<std::string_view, 1> accountStoreMigrations{R"sql(
+inline constexpr std::array<std::string_view, 2> accountStoreMigrations{R"sql(
   CREATE TABLE accounts (
     position INTEGER PRIMARY KEY,
     id TEXT NOT NULL UNIQUE DEFAULT (lower(hex(randomblob(16)))),
@@ -51,6 +51,15 @@ inline constexpr std::array<std::string_view, 1> accountStoreMigrations{R"sql(
     elapsed_seconds REAL NOT NULL
   ) STRICT;
   CREATE INDEX history_of_client ON history (bundle_id, position);
+)sql",
+                                                                        R"sql(
+  CREATE TABLE intents (
+    account_type TEXT NOT NULL,
+    client_id TEXT NOT NULL,
+    kind TEXT NOT NULL CHECK (kind IN ('grant', 'revocation', 'removal')),
+    app_id TEXT,
+    PRIMARY KEY (account_type, client_id)
+  ) STRICT, WITHOUT ROWID;
 )sql"};
 
 }  // namespace palisade

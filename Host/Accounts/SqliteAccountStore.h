@@ -9,7 +9,8 @@
 /// it where an operation says so; after either nothing has changed. A record that is damaged is never handed out as a grant:
 /// its look-up throws, a listing shows it as a refusal, and the next write replaces it.
 //  Contents: 1 Opening, accounts (SqliteAccountStore.cpp)  2 Authorizations (SqliteAccountStoreAuthorizations.cpp)
-//  3 History (SqliteAccountStoreHistory.cpp); the prepared queries of all three are in SqliteAccountStoreStatements.h.
+//  3 Intents (SqliteAccountStoreIntents.cpp)  4 History (SqliteAccountStoreHistory.cpp); the prepared queries of all four are
+//  in SqliteAccountStoreStatements.h.
 
 #include <filesystem>
 #include <functional>
@@ -20,6 +21,7 @@
 #include <string_view>
 #include <vector>
 
+#include "Host/Accounts/Intent.h"
 #include "Host/Sqlite/Database.h"
 #include "Platform/AccountStore.h"
 #include "Platform/AuthorizationManager.h"
@@ -124,6 +126,21 @@ class SqliteAccountStore final : public AccountStore, public AuthorizationManage
   /// Removes the client's refusals that no user gave, or everybody's. Other records stay as they are.
   std::optional<Error> removeAnswersByNobodyForClient(const Client& client);
   std::optional<Error> removeAllAnswersByNobody();
+
+  std::optional<Error> removeAuthorization(const AccountType& accountType, const std::string& clientID);
+  ///@}
+
+  /// \name Intents
+  ///@{
+  /// Notes what is about to be done with a client's access, in place of what was noted for that client before. It is forgotten
+  /// with the next record that is written for the client, or removed.
+  std::optional<Error> noteIntent(const Intent& intent);
+
+  /// Notes the removal of every client that has a record.
+  std::optional<Error> noteRemovalOfAllClients(const AccountType& accountType);
+
+  std::optional<Error> forgetIntent(const AccountType& accountType, std::string_view clientID);
+  std::vector<Intent> intents();
   ///@}
 
   /// \name History
@@ -140,6 +157,8 @@ class SqliteAccountStore final : public AccountStore, public AuthorizationManage
 
   template <typename Work>
   std::optional<Error> _change(const StoreChange& change, Work work);
+  template <typename Work>
+  std::optional<Error> _writeUntold(Work work);
   std::optional<Error> _store(const ClientAuthorization& authorization, const std::shared_ptr<const Client>& client,
                               const AccountType& accountType, bool answeredByNobody);
   std::shared_ptr<const Client> _clientOf(const AuthorizationRow& row) const;

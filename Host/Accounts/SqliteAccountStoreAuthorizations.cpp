@@ -11,6 +11,7 @@
 #include "Host/Accounts/ClientDirectory.h"
 #include "Host/Accounts/RememberedClient.h"
 #include "Host/Accounts/SqliteAccountStoreStatements.h"
+#include "Host/Sqlite/Transaction.h"
 #include "Platform/AccountType.h"
 
 namespace palisade {
@@ -134,15 +135,30 @@ std::optional<Error> SqliteAccountStore::_store(const ClientAuthorization& autho
     return SqliteError(StoreErrorNotRepresentable, _connections->database().path(), storing, error.what()).error();
   }
   const std::int64_t digest = digestOf(accountType.identifier(), row);
-  return _change(changeOf(accountType, row.clientID), [&](Database&, const AccountStoreWriter& writer) {
+  return _change(changeOf(accountType, row.clientID), [&](Database& database, const AccountStoreWriter& writer) {
+    Transaction transaction(database);
     writer.setAuthorization.execute(accountType.identifier(), row.clientID, row.bundleID, row.appName, row.granted,
                                     row.answeredByNobody, row.options, row.permissions, row.updatedAt, digest);
+    writer.forgetIntent.execute(accountType.identifier(), row.clientID);
+    transaction.commit();
+  });
+}
+
+std::optional<Error> SqliteAccountStore::removeAuthorization(const AccountType& accountType, const std::string& clientID) {
+  return _change(changeOf(accountType, clientID), [&](Database& database, const AccountStoreWriter& writer) {
+    Transaction transaction(database);
+    writer.removeAuthorization.execute(accountType.identifier(), clientID);
+    writer.forgetIntent.execute(accountType.identifier(), clientID);
+    transaction.commit();
   });
 }
 
 std::optional<Error> SqliteAccountStore::removeAllClientAuthorizationsForAccountType(const AccountType& accountType) {
-  return _change(changeOf(accountType, std::nullopt), [&](Database&, const AccountStoreWriter& writer) {
+  return _change(changeOf(accountType, std::nullopt), [&](Database& database, const AccountStoreWriter& writer) {
+    Transaction transaction(database);
     writer.removeAuthorizations.execute(accountType.identifier());
+    writer.forgetIntents.execute(accountType.identifier());
+    transaction.commit();
   });
 }
 

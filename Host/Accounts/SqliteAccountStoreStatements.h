@@ -22,6 +22,15 @@ struct AccountStoreWriter {
             " answered_by_nobody = excluded.answered_by_nobody, options = excluded.options,"
             " permissions = excluded.permissions, updated_at = excluded.updated_at, digest = excluded.digest"),
         removeAuthorizations(database, "remove the authorizations", "DELETE FROM authorizations WHERE account_type = ?1"),
+        removeAuthorization(database, "remove an authorization",
+                            "DELETE FROM authorizations WHERE account_type = ?1 AND client_id = ?2"),
+        noteIntent(database, "note what is about to be done",
+                   "INSERT OR REPLACE INTO intents (account_type, client_id, kind, app_id) VALUES (?1, ?2, ?3, ?4)"),
+        noteRemovals(database, "note what is about to be done",
+                     "INSERT OR REPLACE INTO intents (account_type, client_id, kind)"
+                     " SELECT account_type, client_id, ?2 FROM authorizations WHERE account_type = ?1"),
+        forgetIntent(database, "note that it is done", "DELETE FROM intents WHERE account_type = ?1 AND client_id = ?2"),
+        forgetIntents(database, "note that it is done", "DELETE FROM intents WHERE account_type = ?1"),
         removeAnswersByNobodyForClient(database, "remove a refusal that nobody gave",
                                        "DELETE FROM authorizations WHERE answered_by_nobody = 1 AND client_id = ?1"),
         removeAllAnswersByNobody(database, "remove the refusals that nobody gave",
@@ -35,6 +44,11 @@ struct AccountStoreWriter {
   Statement removeAccount;
   Statement setAuthorization;
   Statement removeAuthorizations;
+  Statement removeAuthorization;
+  Statement noteIntent;
+  Statement noteRemovals;
+  Statement forgetIntent;
+  Statement forgetIntents;
   Statement removeAnswersByNobodyForClient;
   Statement removeAllAnswersByNobody;
   Statement appendToHistory;
@@ -54,6 +68,7 @@ struct AccountStoreReader {
         authorizations(database, "list the authorizations",
                        "SELECT client_id, bundle_id, app_name, granted, answered_by_nobody, options, permissions, updated_at,"
                        " digest FROM authorizations NOT INDEXED WHERE account_type = ?1 ORDER BY position"),
+        intents(database, "list what was about to be done", "SELECT account_type, client_id, kind, app_id FROM intents"),
         history(database, "read the history",
                 "SELECT at, account_type, bundle_id, granted, user_prompted, elapsed_seconds FROM history"
                 " ORDER BY position DESC LIMIT ?1"),
@@ -65,6 +80,7 @@ struct AccountStoreReader {
   Statement accountsOfType;
   Statement authorization;
   Statement authorizations;
+  Statement intents;
   Statement history;
   Statement historyOfClient;
 };

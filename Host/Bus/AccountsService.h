@@ -86,8 +86,9 @@ class AccountsService {
   virtual std::string credential(const BusCaller& caller, const std::string& accountType) = 0;
 
   virtual Rows listAccounts(const BusCaller& caller, const std::string& accountType) = 0;
+  /// `readToken` waits for whoever sends the token, for seconds at most.
   virtual std::string addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
-                                 std::string token) = 0;
+                                 const std::function<std::string()>& readToken) = 0;
   virtual void removeAccount(const BusCaller& caller, const std::string& id) = 0;
 
   virtual Rows listGrants(const BusCaller& caller, const std::string& accountType) = 0;

@@ -1,11 +1,13 @@
 #include "Host/Bus/BusServer.h"
 
 #include <fcntl.h>
+#include <poll.h>
 #include <sdbus-c++/sdbus-c++.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <map>
 #include <mutex>
 
@@ -20,6 +22,7 @@ namespace {
 constexpr const char* busName = "com.veltran.Accounts1";
 constexpr const char* objectPath = "/com/veltran/Accounts1";
 constexpr std::size_t longestAccountToken = 64 * 1024;
+constexpr std::chrono::seconds longestTokenTransfer(10);
 
 using BusRows = std::vector<BusDictionary>;
 
@@ -58,10 +61,20 @@ std::optional<Type> optionOf(const BusDictionary& options, const std::string& ke
   return option->second.get<Type>();
 }
 
+// Whoever sends a token has it; a descriptor that stays silent is not waited for.
 std::string readToEnd(const sdbus::UnixFd& descriptor) {
+  const auto deadline = std::chrono::steady_clock::now() + longestTokenTransfer;
   std::string content;
   char buffer[4096];
   while (true) {
+    const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now());
+    pollfd source{.fd = descriptor.get(), .events = POLLIN, .revents = 0};
+    const int ready = left.count() > 0 ? poll(&source, 1, static_cast<int>(left.count())) : 0;
+    if (ready < 0 && errno == EINTR) continue;
+    if (ready == 0) {
+      throw BusFailure(BusFailureKind::invalidArguments,
+                       "The token did not come to its end within 10 seconds. Write it, and close the descriptor.");
+    }
     const ssize_t length = read(descriptor.get(), buffer, sizeof buffer);
     if (length < 0 && errno == EINTR) continue;
     if (length < 0) throw BusFailure(BusFailureKind::invalidArguments, "The token could not be read from its descriptor.");
@@ -165,8 +178,7 @@ class BusServer::Implementation final : private OwnedConnection,
   void AddAccount(sdbus::Result<std::string>&& result, std::string accountType, std::string username, sdbus::UnixFd token,
                   BusDictionary options) override {
     start(std::move(result), options, {}, [this, accountType, username, token](const BusCaller& caller) {
-      BusLoop::handOver();
-      return _service.addAccount(caller, accountType, username, readToEnd(token));
+      return _service.addAccount(caller, accountType, username, [&token] { return readToEnd(token); });
     });
   }
 

@@ -12,6 +12,7 @@
 #include "Host/Daemon/AccountOperations.h"
 #include "Host/Daemon/AlertScheduler.h"
 #include "Host/Daemon/CrashRepair.h"
+#include "Host/Daemon/OperationKeychain.h"
 #include "Host/Daemon/Paths.h"
 #include "Host/Daemon/PluginHost.h"
 #include "Host/Http/HttpClient.h"
@@ -96,11 +97,12 @@ struct AccountDaemon::Parts {
                  .pluginFor = [this](std::string_view accountType) { return plugins->pluginFor(accountType); },
                  .revocations = [this] { return revocations(); },
                  .status = [this] { return status(); }}),
+        pluginKeychain(*keychain, store, [this](const std::string& clientID) { return service.operationOf(clientID); }),
         bus(service) {
     // Only the owner of the bus name may repair: another daemon could be in the middle of a grant.
     for (const std::string& sentence : repairAfterCrash(store, *keychain, outbox)) tell(sentence);
     plugins.emplace(configuration.plugins, PlatformServices{.log = &log,
-                                                            .keychain = keychain.get(),
+                                                            .keychain = &pluginKeychain,
                                                             .social = &social,
                                                             .alert = &alert,
                                                             .preferences = &preferences,
@@ -184,6 +186,7 @@ struct AccountDaemon::Parts {
   TerminalAlert terminal;
   AlertScheduler alert;
   AccountOperations service;
+  OperationKeychain pluginKeychain;
   BusServer bus;
   std::optional<PluginHost> plugins;
   std::atomic<bool> isServing = false;

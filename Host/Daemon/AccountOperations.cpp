@@ -52,6 +52,15 @@ auto preferenceCall(const Call& call) {
   }
 }
 
+std::optional<std::string> textUnder(const Dictionary& options, std::string_view key) {
+  const Value* value = options.find(key);
+  return value == nullptr || value->string() == nullptr ? std::nullopt : std::optional(*value->string());
+}
+
+void refuseUnlessStored(const std::optional<Error>& error) {
+  if (error) throw BusFailure(BusFailureKind::storeUnavailable, error->description.value_or("The store refused."));
+}
+
 /// Runs a piece of work when the scope ends.
 template <typename Work>
 class AtEnd {
@@ -71,7 +80,7 @@ AccessOutcome AccountOperations::requestAccess(const BusCaller& caller, const st
                                                const Dictionary& accessOptions, PendingRequest& request) {
   const auto client = clientOf(caller);
   const auto options = std::make_shared<const Dictionary>(accessOptions);
-  return carryOut(caller, client, accountType, request,
+  return carryOut(caller, client, accountType, textUnder(accessOptions, FacebookAppIdKey), request,
                   [&](auto& plugin, const auto& type, const auto& store, auto completion) {
                     plugin.handleAccessRequestToAccountsOfType(type, client, options, store, true, std::move(completion));
                   });
@@ -81,7 +90,7 @@ AccessOutcome AccountOperations::authorize(const BusCaller& caller, const std::s
                                            PendingRequest& request) {
   refuseUnlessManager(caller);
   const auto client = registeredClient(clientID);
-  return carryOut(caller, client, accountType, request,
+  return carryOut(caller, client, accountType, std::nullopt, request,
                   [&](auto& plugin, const auto& type, const auto& store, auto completion) {
                     // The person who manages grants has decided; what is stored is their answer.
                     Operation::current()->userHasAnswered();
@@ -91,12 +100,15 @@ AccessOutcome AccountOperations::authorize(const BusCaller& caller, const std::s
 }
 
 AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::shared_ptr<const RegisteredClient>& client,
-                                          const std::string& accountType, PendingRequest& request, const PluginCall& call) {
+                                          const std::string& accountType, const std::optional<std::string>& appID,
+                                          PendingRequest& request, const PluginCall& call) {
   const auto plugin = pluginFor(accountType);
-  const auto operation = std::make_shared<Operation>([&request] {
-    request.becomePending();
-    BusLoop::handOver();
-  });
+  const auto operation = std::make_shared<Operation>(
+      [&request] {
+        request.becomePending();
+        BusLoop::handOver();
+      },
+      Intent{.kind = Intent::Kind::grant, .accountTypeIdentifier = accountType, .clientID = client->id(), .appID = appID});
   {
     const std::lock_guard lock(_mutex);
     _running.emplace(
@@ -111,6 +123,10 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
   try {
     const auto turn = _lanes.enter(client->id(), ClientLanes::Bound::kept, [&] { operation->aboutToWait(); });
     if (operation->isWithdrawn()) return {.response = AccessResponse::withdrawn};
+    {
+      const std::lock_guard lock(_mutex);
+      _running.at(operation.get()).hasTurn = true;
+    }
 
     const OperationScope scope(*operation);
     const auto outcome = std::make_shared<std::promise<AccessOutcome>>();
@@ -126,6 +142,7 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
       _parts.store.removeAnswersByNobodyForClient(*client);
       if (operation->isLeftUnanswered()) result.response = AccessResponse::withdrawn;
     }
+    if (const auto failure = operation->failure()) throw BusFailure(*failure);
     return result;
   } catch (const LaneIsFull& failure) {
     throw BusFailure(BusFailureKind::tooManyRequests, failure.what());
@@ -166,15 +183,16 @@ Rows AccountOperations::listAccounts(const BusCaller& caller, const std::string&
 }
 
 std::string AccountOperations::addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
-                                          std::string token) {
+                                          const std::function<std::string()>& readToken) {
   refuseUnlessManager(caller);
   pluginFor(accountType);
-  while (token.ends_with('\n') || token.ends_with('\r')) token.pop_back();
   if (username.empty()) throw BusFailure(BusFailureKind::invalidArguments, "An account needs a user name.");
+  BusLoop::handOver();
+  std::string token = receiveToken(caller, readToken);
+  while (token.ends_with('\n') || token.ends_with('\r')) token.pop_back();
   if (token.empty() || token.size() > longestToken) {
     throw BusFailure(BusFailureKind::invalidArguments, "An account needs a token of at most 64 KiB.");
   }
-  BusLoop::handOver();
   const AccountRecord record = _parts.store.addAccount(accountType, username, username);
   const auto account = std::make_shared<StoredAccount>(record.id, record.username, record.description);
   account->setCredential(std::make_shared<const AccountCredential>(std::move(token), "", distantFuture));
@@ -183,6 +201,24 @@ std::string AccountOperations::addAccount(const BusCaller& caller, const std::st
     throw BusFailure(BusFailureKind::keychainUnavailable, error->description.value_or("The keychain refused the token."));
   }
   return record.id;
+}
+
+// Each transfer holds a thread, so a connection gets only so many.
+std::string AccountOperations::receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken) {
+  {
+    const std::lock_guard lock(_mutex);
+    if (_tokenTransfers[caller.uniqueName] >= longestLane) {
+      throw BusFailure(BusFailureKind::tooManyRequests,
+                       "This connection is sending " + std::to_string(longestLane) + " tokens already. Finish one first.");
+    }
+    ++_tokenTransfers[caller.uniqueName];
+  }
+  const AtEnd finished([&] {
+    const std::lock_guard lock(_mutex);
+    const auto transfers = _tokenTransfers.find(caller.uniqueName);
+    if (--transfers->second == 0) _tokenTransfers.erase(transfers);
+  });
+  return readToken();
 }
 
 void AccountOperations::removeAccount(const BusCaller& caller, const std::string& id) {
@@ -224,9 +260,13 @@ void AccountOperations::revoke(const BusCaller& caller, const std::string& accou
   withdraw([&](const Running& running) { return running.client == clientID; });
   BusLoop::handOver();
   const auto turn = _lanes.enter(clientID, ClientLanes::Bound::waived, [] {});
+  refuseUnlessStored(
+      _parts.store.noteIntent({.kind = Intent::Kind::revocation, .accountTypeIdentifier = accountType, .clientID = clientID}));
   manage(accountType, [&](auto& plugin, const auto& type, const auto& store, auto completion) {
     plugin.revokeAccessToAccountsOfType(type, client, store, std::move(completion));
   });
+  // A client that never had a record gets none.
+  _parts.store.forgetIntent(AccountType(accountType), clientID);
 }
 
 void AccountOperations::revokeAll(const BusCaller& caller, const std::string& accountType) {
@@ -234,6 +274,7 @@ void AccountOperations::revokeAll(const BusCaller& caller, const std::string& ac
   withdraw([](const Running&) { return true; });
   BusLoop::handOver();
   const auto turn = _lanes.enterAll([] {});
+  refuseUnlessStored(_parts.store.noteRemovalOfAllClients(AccountType(accountType)));
   manage(accountType, [&](auto& plugin, const auto& type, const auto& store, auto completion) {
     plugin.revokeAllAccessToAccountsOfType(type, store, std::move(completion));
   });
@@ -255,6 +296,7 @@ void AccountOperations::manage(const std::string& accountType, const PluginCall&
     throw BusFailure(BusFailureKind::failed, result.error && result.error->description ? *result.error->description
                                                                                        : "The revocation was not carried out.");
   }
+  if (const auto failure = operation->failure()) throw BusFailure(*failure);
 }
 
 Rows AccountOperations::history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) {
@@ -317,6 +359,13 @@ void AccountOperations::callerLeft(const std::string& uniqueName) {
     _clientsByConnection.erase(uniqueName);
   }
   withdraw([&](const Running& running) { return running.caller == uniqueName; });
+}
+
+std::shared_ptr<Operation> AccountOperations::operationOf(const std::string& clientID) {
+  const std::lock_guard lock(_mutex);
+  const auto found = std::ranges::find_if(
+      _running, [&](const auto& entry) { return entry.second.hasTurn && entry.second.client == clientID; });
+  return found == _running.end() ? nullptr : found->second.operation;
 }
 
 void AccountOperations::withdrawAll() {

@@ -51,7 +51,7 @@ class AccountOperations final : public AccountsService {
 
   Rows listAccounts(const BusCaller& caller, const std::string& accountType) override;
   std::string addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
-                         std::string token) override;
+                         const std::function<std::string()>& readToken) override;
   void removeAccount(const BusCaller& caller, const std::string& id) override;
 
   Rows listGrants(const BusCaller& caller, const std::string& accountType) override;
@@ -69,6 +69,9 @@ class AccountOperations final : public AccountsService {
   void close(std::uint64_t requestIdentifier) override;
   void callerLeft(const std::string& uniqueName) override;
 
+  /// The operation whose turn it is among a client's, or null.
+  std::shared_ptr<Operation> operationOf(const std::string& clientID);
+
   /// Withdraws everything that waits; the daemon is about to end.
   void withdrawAll();
 
@@ -81,6 +84,7 @@ class AccountOperations final : public AccountsService {
     std::string caller;
     std::string client;
     std::uint64_t request;
+    bool hasTurn = false;
   };
   using Withdrawable = std::function<bool(const Running&)>;
   using PluginCall = std::function<void(AccountAccessPlugin&, const std::shared_ptr<const AccountType>&,
@@ -92,15 +96,19 @@ class AccountOperations final : public AccountsService {
   std::shared_ptr<AccountAccessPlugin> pluginFor(const std::string& accountType) const;
 
   AccessOutcome carryOut(const BusCaller& caller, const std::shared_ptr<const RegisteredClient>& client,
-                         const std::string& accountType, PendingRequest& request, const PluginCall& call);
+                         const std::string& accountType, const std::optional<std::string>& appID, PendingRequest& request,
+                         const PluginCall& call);
   void manage(const std::string& accountType, const PluginCall& call);
   void withdraw(const Withdrawable& isMeant);
+  std::string receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken);
 
   Parts _parts;
   ClientLanes _lanes;
   std::mutex _mutex;
   std::map<std::string, std::shared_ptr<const RegisteredClient>> _clientsByConnection;
   std::map<Operation*, Running> _running;
+  /// How many tokens each connection is sending.
+  std::map<std::string, std::size_t> _tokenTransfers;
 };
 
 }  // namespace palisade

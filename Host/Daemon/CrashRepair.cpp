@@ -7,54 +7,110 @@
 #include "Host/Keychain/Keychain.h"
 #include "Host/Vantad/Outbox.h"
 #include "Platform/AccountConstants.h"
+#include "Platform/AccountType.h"
 #include "Platform/Client.h"
 
 namespace palisade {
 namespace {
 
-const StoredAuthorization* recordOf(const std::vector<StoredAuthorization>& records, const std::string& clientID) {
-  const auto found = std::ranges::find_if(
-      records, [&](const StoredAuthorization& stored) { return stored.record->client()->bundleID() == clientID; });
-  return found == records.end() ? nullptr : &*found;
-}
-
-const std::string* appIDOf(const StoredAuthorization* stored) {
-  if (stored == nullptr || stored->record->options() == nullptr) return nullptr;
+std::optional<std::string> appIDOf(const StoredAuthorization* stored) {
+  if (stored == nullptr || stored->record->options() == nullptr) return std::nullopt;
   const Value* appID = stored->record->options()->find(FacebookAppIdKey);
-  return appID == nullptr ? nullptr : appID->string();
+  return appID == nullptr || appID->string() == nullptr ? std::nullopt : std::optional(*appID->string());
 }
 
-void repairAccount(const AccountRecord& account, SqliteAccountStore& store, Keychain& keychain, Outbox& outbox,
-                   std::vector<std::string>& report) {
-  const auto records = store.storedAuthorizations(account.accountTypeIdentifier);
-  const auto object = std::make_shared<StoredAccount>(account.id, account.username, account.description);
-  for (const std::string& clientID : keychain.clientIDsWithCredentials(object)) {
-    const StoredAuthorization* stored = recordOf(records, clientID);
-    if (stored != nullptr && stored->record->isGranted()) continue;
-    // First the queue, then the keychain: a second crash in between repeats the harmless half.
-    if (const std::string* appID = appIDOf(stored)) outbox.add(account.id, *appID);
-    if (const auto error = keychain.removeCredentialForAccount(object, clientID)) {
-      report.push_back("The token of " + clientID +
-                       " has no grant and could not be removed: " + error->description.value_or("the keychain refused") + ".");
-    } else {
-      report.push_back("The token of " + clientID + " had no grant and was removed.");
+bool isGranted(const StoredAuthorization* stored) { return stored != nullptr && stored->record->isGranted(); }
+
+void orThrow(const std::optional<Error>& error) {
+  if (error) throw std::runtime_error(error->description.value_or("It was refused."));
+}
+
+class Repair {
+ public:
+  Repair(SqliteAccountStore& store, Keychain& keychain, Outbox& outbox) : _store(store), _keychain(keychain), _outbox(outbox) {}
+
+  std::vector<std::string> carryOut() {
+    _store.removeAllAnswersByNobody();
+    const auto accounts = _store.accounts();
+    for (const Intent& intent : _store.intents()) {
+      const auto account = std::ranges::find(accounts, intent.accountTypeIdentifier, &AccountRecord::accountTypeIdentifier);
+      attempt("What was begun with the access of " + intent.clientID + " could not be brought to an end: ",
+              [&] { finish(intent, account == accounts.end() ? nullptr : &*account); });
+    }
+    for (const AccountRecord& account : accounts) {
+      attempt("The tokens of the account " + account.description + " could not be checked: ",
+              [&] { removeTokensWithoutGrant(account); });
+    }
+    return std::move(_report);
+  }
+
+ private:
+  template <typename Work>
+  void attempt(const std::string& trouble, const Work& work) {
+    try {
+      work();
+    } catch (const std::exception& failure) {
+      _report.push_back(trouble + failure.what());
     }
   }
-}
+
+  // A grant that was cut off is undone: nobody was told of it. A revocation is finished: somebody wanted it.
+  void finish(const Intent& intent, const AccountRecord* account) {
+    const AccountType accountType(intent.accountTypeIdentifier);
+    const auto records = _store.storedAuthorizations(intent.accountTypeIdentifier);
+    const auto found = std::ranges::find(records, intent.clientID, &StoredAuthorization::clientID);
+    const StoredAuthorization* stored = found == records.end() ? nullptr : &*found;
+    const bool isCutGrant = intent.kind == Intent::Kind::grant && !isGranted(stored);
+    if (account != nullptr && (isCutGrant || intent.kind != Intent::Kind::grant)) {
+      takeBackToken(*account, intent.clientID, intent.appID ? intent.appID : appIDOf(stored));
+    }
+    if (intent.kind == Intent::Kind::revocation && stored != nullptr) {
+      stored->record->setIsGranted(false);
+      stored->record->setGrantedPermissions(nullptr);
+      orThrow(_store.setAuthorization(*stored->record, stored->record->client(), accountType));
+    }
+    if (intent.kind == Intent::Kind::removal) orThrow(_store.removeAuthorization(accountType, intent.clientID));
+    orThrow(_store.forgetIntent(accountType, intent.clientID));
+    if (isCutGrant) _report.push_back("The grant of " + intent.clientID + " was cut off and has been undone.");
+    if (intent.kind != Intent::Kind::grant) {
+      _report.push_back("The revocation of " + intent.clientID + " was cut off and has been finished.");
+    }
+  }
+
+  void removeTokensWithoutGrant(const AccountRecord& account) {
+    const auto records = _store.storedAuthorizations(account.accountTypeIdentifier);
+    for (const std::string& clientID : _keychain.clientIDsWithCredentials(objectOf(account))) {
+      const auto found = std::ranges::find_if(
+          records, [&](const StoredAuthorization& stored) { return stored.record->client()->bundleID() == clientID; });
+      const StoredAuthorization* stored = found == records.end() ? nullptr : &*found;
+      if (isGranted(stored)) continue;
+      attempt("The token of " + clientID + " has no grant and could not be removed: ", [&] {
+        takeBackToken(account, clientID, appIDOf(stored));
+        _report.push_back("The token of " + clientID + " had no grant and was removed.");
+      });
+    }
+  }
+
+  // First the queue, then the keychain: a second crash in between repeats the harmless half.
+  void takeBackToken(const AccountRecord& account, const std::string& clientID, const std::optional<std::string>& appID) {
+    if (appID) _outbox.add(account.id, *appID);
+    orThrow(_keychain.removeCredentialForAccount(objectOf(account), clientID));
+  }
+
+  static std::shared_ptr<Account> objectOf(const AccountRecord& account) {
+    return std::make_shared<StoredAccount>(account.id, account.username, account.description);
+  }
+
+  SqliteAccountStore& _store;
+  Keychain& _keychain;
+  Outbox& _outbox;
+  std::vector<std::string> _report;
+};
 
 }  // namespace
 
 std::vector<std::string> repairAfterCrash(SqliteAccountStore& store, Keychain& keychain, Outbox& outbox) {
-  std::vector<std::string> report;
-  store.removeAllAnswersByNobody();
-  for (const AccountRecord& account : store.accounts()) {
-    try {
-      repairAccount(account, store, keychain, outbox, report);
-    } catch (const std::exception& failure) {
-      report.push_back("The tokens of the account " + account.description + " could not be checked: " + failure.what());
-    }
-  }
-  return report;
+  return Repair(store, keychain, outbox).carryOut();
 }
 
 }  // namespace palisade

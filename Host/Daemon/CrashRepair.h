@@ -2,9 +2,10 @@
 
 /// Mends, before the daemon serves anybody, what a crash may have left between the keychain and the grants.
 ///
-/// A grant is made in this order: token into the keychain, then the record. So a client's token without a granted record is
-/// what a crash leaves: it is removed from the keychain, and its invalidation at the server is queued where the app is known.
-/// Refusals that no user gave are removed too. Threads: once, at start. Errors: the stores' exceptions; a keychain that cannot
+/// A grant is made in this order: intent, token into the keychain, record. One that was cut off is undone: its token is removed
+/// from the keychain and the invalidation at the server queued. A revocation goes the same way: intent, invalidation, token,
+/// record; one that was cut off is finished. Tokens that no grant answers for, for whatever reason, are removed too, and so are
+/// refusals that no user gave. Threads: once, at start. Errors: the stores' exceptions; a keychain that cannot
 /// be read is left for the next start, and told.
 
 #include <string>

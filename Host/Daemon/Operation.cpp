@@ -18,6 +18,16 @@ void Operation::aboutToWait() {
   if (const auto first = std::exchange(_beforeFirstWait, nullptr)) first();
 }
 
+void Operation::fail(const BusFailure& failure) {
+  const std::lock_guard lock(_mutex);
+  if (!_failure) _failure = failure;
+}
+
+std::optional<BusFailure> Operation::failure() const {
+  const std::lock_guard lock(_mutex);
+  return _failure;
+}
+
 void Operation::withdraw() {
   std::shared_ptr<const std::function<void()>> interrupt;
   {

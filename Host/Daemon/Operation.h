@@ -10,16 +10,25 @@
 #include <functional>
 #include <memory>
 #include <mutex>
+#include <optional>
+
+#include "Host/Accounts/Intent.h"
+#include "Host/Bus/AccountsService.h"
 
 namespace palisade {
 
 class Operation {
  public:
   /// `beforeFirstWait` is called once, on the operation's thread, before it waits for a user or a server.
-  explicit Operation(std::function<void()> beforeFirstWait) : _beforeFirstWait(std::move(beforeFirstWait)) {}
+  /// `grant` is what the operation may come to.
+  explicit Operation(std::function<void()> beforeFirstWait, std::optional<Intent> grant = std::nullopt)
+      : _beforeFirstWait(std::move(beforeFirstWait)),
+        _grant(std::move(grant)) {}
 
   /// The operation that the calling thread carries, or null.
   static Operation* current();
+
+  const std::optional<Intent>& grant() const { return _grant; }
 
   /// The operation may wait for long from here on.
   void aboutToWait();
@@ -39,15 +48,21 @@ class Operation {
   void alertWentUnanswered() { _wentUnanswered.store(true, std::memory_order_release); }
   bool isLeftUnanswered() const { return isWithdrawn() || _wentUnanswered.load(std::memory_order_acquire); }
 
+  /// A step of the operation could not be stored: whatever its plug-in answers, it has failed. The first failure counts.
+  void fail(const BusFailure& failure);
+  std::optional<BusFailure> failure() const;
+
  private:
   friend class OperationScope;
 
   std::function<void()> _beforeFirstWait;
+  const std::optional<Intent> _grant;
   std::atomic<bool> _isWithdrawn = false;
   std::atomic<bool> _userAnswered = false;
   std::atomic<bool> _wentUnanswered = false;
-  std::mutex _mutex;
+  mutable std::mutex _mutex;
   std::shared_ptr<const std::function<void()>> _interrupt;
+  std::optional<BusFailure> _failure;
 };
 
 /// Makes an operation the calling thread's current one.

@@ -3,9 +3,10 @@
 /// The account store as one operation sees it.
 ///
 /// A refusal that the user did not give (the alert was withdrawn, nobody could be asked) is stored with that mark, so that it
-/// can be removed when the operation has ended: the plug-in asks for the record and gets it, but it does not stay. Threads:
-/// used by the operation's thread and by the threads that bring its server's answers. Ownership: shared by the plug-in's
-/// callbacks; keeps the operation, borrows the store. Errors: the store's.
+/// can be removed when the operation has ended: the plug-in asks for the record and gets it, but it does not stay. A record
+/// that could not be stored fails the operation, whatever the plug-in makes of it. Threads: used by the operation's thread and
+/// by the threads that bring its server's answers. Ownership: shared by the plug-in's callbacks; keeps the operation, borrows
+/// the store. Errors: the store's.
 
 #include <memory>
 
@@ -38,17 +39,26 @@ class OperationStore final : public AccountStore, public AuthorizationManager {
   std::optional<Error> setAuthorization(const ClientAuthorization& authorization,
                                         const std::shared_ptr<const Client>& forClient,
                                         const AccountType& onAccountType) override {
-    if (authorization.isGranted() || _operation->isAnsweredByUser()) {
-      return _store.setAuthorization(authorization, forClient, onAccountType);
+    if (authorization.isGranted() && _operation->failure()) {
+      return Error{.domain = std::string(StoreErrorDomain),
+                   .code = StoreErrorConstraint,
+                   .description = "A grant whose token could not be stored is not recorded."};
     }
-    return _store.setAuthorizationAnsweredByNobody(authorization, forClient, onAccountType);
+    return answered(authorization.isGranted() || _operation->isAnsweredByUser()
+                        ? _store.setAuthorization(authorization, forClient, onAccountType)
+                        : _store.setAuthorizationAnsweredByNobody(authorization, forClient, onAccountType));
   }
 
   std::optional<Error> removeAllClientAuthorizationsForAccountType(const AccountType& accountType) override {
-    return _store.removeAllClientAuthorizationsForAccountType(accountType);
+    return answered(_store.removeAllClientAuthorizationsForAccountType(accountType));
   }
 
  private:
+  std::optional<Error> answered(std::optional<Error> error) {
+    if (error) _operation->fail({BusFailureKind::storeUnavailable, error->description.value_or("The store refused.")});
+    return error;
+  }
+
   SqliteAccountStore& _store;
   std::shared_ptr<Operation> _operation;
 };

@@ -1,0 +1,46 @@
+#include "Host/Daemon/OperationKeychain.h"
+
+#include <utility>
+
+#include "Host/Accounts/SqliteAccountStore.h"
+#include "Host/Daemon/Operation.h"
+
+namespace palisade {
+namespace {
+
+// Passes an error on, and has the operation fail with it.
+std::optional<Error> answered(std::optional<Error> error, BusFailureKind kind, Operation* operation) {
+  if (error && operation != nullptr) operation->fail({kind, error->description.value_or("The keychain refused.")});
+  return error;
+}
+
+}  // namespace
+
+OperationKeychain::OperationKeychain(KeychainManager& keychain, SqliteAccountStore& store, Finder operationOf)
+    : _keychain(keychain),
+      _store(store),
+      _operationOf(std::move(operationOf)) {}
+
+std::shared_ptr<const AccountCredential> OperationKeychain::credentialForAccount(const std::shared_ptr<Account>& account,
+                                                                                 const std::optional<std::string>& clientID) {
+  return _keychain.credentialForAccount(account, clientID);
+}
+
+std::optional<Error> OperationKeychain::setCredentialForAccount(const std::shared_ptr<Account>& account,
+                                                                const std::optional<std::string>& clientID) {
+  // The server's answers come on threads that carry no operation.
+  const auto operation = clientID ? _operationOf(*clientID) : nullptr;
+  if (operation != nullptr && operation->grant()) {
+    auto unnoted = _store.noteIntent(*operation->grant());
+    if (unnoted) return answered(std::move(unnoted), BusFailureKind::storeUnavailable, operation.get());
+  }
+  return answered(_keychain.setCredentialForAccount(account, clientID), BusFailureKind::keychainUnavailable, operation.get());
+}
+
+std::optional<Error> OperationKeychain::removeCredentialForAccount(const std::shared_ptr<Account>& account,
+                                                                   const std::optional<std::string>& clientID) {
+  return answered(_keychain.removeCredentialForAccount(account, clientID), BusFailureKind::keychainUnavailable,
+                  Operation::current());
+}
+
+}  // namespace palisade

@@ -1,0 +1,40 @@
+#pragma once
+
+/// The keychain as the plug-ins see it: it knows for whose operation it works.
+///
+/// Before a client's token is stored, the grant that it is for is noted in the account store, so that a crash between the two
+/// leaves no token that nobody answers for. A keychain that refuses fails the operation: no grant stands without its token.
+/// Threads: as `KeychainManager` says. Ownership: borrows the keychain and the store. Errors: the keychain's and the store's.
+
+#include <functional>
+#include <memory>
+#include <string>
+
+#include "Platform/KeychainManager.h"
+
+namespace palisade {
+
+class Operation;
+class SqliteAccountStore;
+
+class OperationKeychain final : public KeychainManager {
+ public:
+  /// The operation that a client's turn belongs to, or null.
+  using Finder = std::function<std::shared_ptr<Operation>(const std::string& clientID)>;
+
+  OperationKeychain(KeychainManager& keychain, SqliteAccountStore& store, Finder operationOf);
+
+  std::shared_ptr<const AccountCredential> credentialForAccount(const std::shared_ptr<Account>& account,
+                                                                const std::optional<std::string>& clientID) override;
+  std::optional<Error> setCredentialForAccount(const std::shared_ptr<Account>& account,
+                                               const std::optional<std::string>& clientID) override;
+  std::optional<Error> removeCredentialForAccount(const std::shared_ptr<Account>& account,
+                                                  const std::optional<std::string>& clientID) override;
+
+ private:
+  KeychainManager& _keychain;
+  SqliteAccountStore& _store;
+  const Finder _operationOf;
+};
+
+}  // namespace palisade

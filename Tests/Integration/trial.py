@@ -1,0 +1,255 @@
+"""A session for tests: a private bus, a Facebook server, both daemons and a person, each of which a test can start, stop and alter."""
+
+import os
+import pathlib
+import pty
+import re
+import select
+import shutil
+import signal
+import subprocess
+import sys
+import tempfile
+import threading
+import time
+import tty
+
+from accounts import NAME, Caller
+from bus_wire import MEMBER
+
+PROJECT = pathlib.Path(__file__).resolve().parents[2]
+BUILD = PROJECT / "build/debug"
+# The program that this is: what the daemon takes a caller in this process for.
+THIS_PROGRAM = os.path.realpath("/proc/self/exe")
+
+BUS_CONFIGURATION = """<!DOCTYPE busconfig PUBLIC "-//freedesktop//DTD D-Bus Bus Configuration 1.0//EN"
+ "http://www.freedesktop.org/standards/dbus/1.0/busconfig.dtd">
+<busconfig>
+  <type>session</type>
+  <listen>unix:path={path}</listen>
+  <auth>EXTERNAL</auth>
+  <policy context="default">
+    <allow send_destination="*" eavesdrop="true"/> <allow eavesdrop="true"/> <allow own="*"/>
+  </policy>
+  <limit name="max_completed_connections">4000</limit>
+  <limit name="max_incomplete_connections">4000</limit>
+  <limit name="max_connections_per_user">4000</limit>
+  <limit name="max_replies_per_connection">50000</limit>
+  <limit name="max_match_rules_per_connection">4000</limit>
+  <limit name="max_incoming_bytes">1000000000</limit>
+  <limit name="max_outgoing_bytes">1000000000</limit>
+  <limit name="max_message_size">134217728</limit>
+</busconfig>
+"""
+
+
+def use_build_of_command_line() -> None:
+    """Takes the build folder from the command line, before unittest reads it."""
+    global BUILD
+    if len(sys.argv) > 1 and "/" in sys.argv[1]:
+        BUILD = pathlib.Path(sys.argv.pop(1)).resolve()
+
+
+def wait_until(is_true, what: str, timeout: float = 20):
+    """Asks again and again for what nobody announces."""
+    deadline = time.monotonic() + timeout
+    while not (result := is_true()):
+        if time.monotonic() > deadline:
+            raise TimeoutError(f"Gave up waiting: {what}")
+        time.sleep(0.01)
+    return result
+
+
+class Person:
+    """Sits at a terminal of their own and answers what the daemon asks there."""
+
+    KEYS = {"allow": b"\r", "refuse": b"\t\r", "close": b"\x1b", "nothing": b""}
+    # An alert takes no consent before it has stood for half a second.
+    READING_TIME = 0.55
+
+    def __init__(self, answer: str):
+        self.answer = answer
+        self.alerts = 0
+        self._changed = threading.Condition()
+        self._screen, terminal = pty.openpty()
+        tty.setraw(terminal)
+        self._terminal = terminal
+        self.path = os.ttyname(terminal)
+        self._leave, self._left = os.pipe()
+        self._thread = threading.Thread(target=self._watch, daemon=True)
+        self._thread.start()
+
+    def leave(self) -> None:
+        os.write(self._left, b"x")
+        self._thread.join()
+        for descriptor in (self._screen, self._terminal, self._leave, self._left):
+            os.close(descriptor)
+
+    def wait_for_alert(self, number: int, timeout: float = 20) -> None:
+        with self._changed:
+            if not self._changed.wait_for(lambda: self.alerts >= number, timeout):
+                raise TimeoutError(f"{self.alerts} alerts came instead of {number}.")
+
+    def press(self, keys: bytes) -> None:
+        os.write(self._screen, keys)
+
+    def _watch(self) -> None:
+        seen = ""
+        while True:
+            readable, _, _ = select.select([self._screen, self._leave], [], [])
+            if self._leave in readable:
+                return
+            seen += os.read(self._screen, 1 << 16).decode(errors="replace")
+            # A dialog that is drawn again, for another button, begins without the empty line.
+            while (whole := re.search(r"\r\n(?:\x1b\[[0-9;]*[A-Za-z])*┌.*?┘", seen, re.DOTALL)):
+                seen = seen[whole.end():]
+                self._meet_alert()
+
+    def _meet_alert(self) -> None:
+        with self._changed:
+            self.alerts += 1
+            self._changed.notify_all()
+        if self.answer == "allow":
+            select.select([self._leave], [], [], self.READING_TIME)
+        os.write(self._screen, self.KEYS[self.answer])
+
+
+class Trial:
+    def __init__(self, answer: str = "allow", log: str = "notice"):
+        self.root = pathlib.Path(tempfile.mkdtemp(prefix="palisade-trial."))
+        self.state = self.root / "state/palisade"
+        self.configuration = self.root / "config/palisade"
+        self.clients = self.root / "data/palisade/clients"
+        for folder in ("home", "runtime", "bin"):
+            (self.root / folder).mkdir(mode=0o700)
+        for folder in (self.state, self.configuration, self.clients):
+            folder.mkdir(mode=0o700, parents=True)
+        self.environment = {
+            "PATH": f"{self.root}/bin:{BUILD}/bin:{os.environ['PATH']}", "LC_ALL": "C.UTF-8", "NO_COLOR": "1",
+            "HOME": f"{self.root}/home", "XDG_RUNTIME_DIR": f"{self.root}/runtime", "XDG_CONFIG_HOME": f"{self.root}/config",
+            "XDG_STATE_HOME": f"{self.root}/state", "XDG_DATA_HOME": f"{self.root}/data",
+        } | {name: value for name, value in os.environ.items() if name.endswith("SAN_OPTIONS")}
+        self._processes: list[subprocess.Popen] = []
+        self.person = Person(answer)
+        self.log_level = log
+        self.accountd: subprocess.Popen | None = None
+        self.vantad: subprocess.Popen | None = None
+        try:
+            self._start_bus()
+            self._start_sandbox()
+            self.add_client("photos", THIS_PROGRAM)
+            self.configure()
+        except BaseException:
+            self.close()
+            raise
+
+    def __enter__(self):
+        return self
+
+    def __exit__(self, *_):
+        self.close()
+
+    def close(self) -> None:
+        for process in reversed(self._processes):
+            if process.poll() is None:
+                process.kill()
+            process.wait()
+            for stream in (process.stdout, process.stderr):
+                if stream is not None:
+                    stream.close()
+        self.person.leave()
+        shutil.rmtree(self.root, ignore_errors=True)
+
+    def start(self, *command, **more) -> subprocess.Popen:
+        process = subprocess.Popen([str(word) for word in command], env=self.environment | more.pop("environment", {}),
+                                   stdin=subprocess.DEVNULL, **more)
+        self._processes.append(process)
+        return process
+
+    def run(self, *command, **more) -> subprocess.CompletedProcess:
+        """Runs a command to its end; what it prints, its errors among it, is `stdout`."""
+        return subprocess.run([str(word) for word in command], env=self.environment, text=True, timeout=60, check=False,
+                              stdout=subprocess.PIPE, stderr=subprocess.STDOUT, **more)
+
+    def _start_bus(self) -> None:
+        path = self.root / "bus"
+        configuration = self.root / "bus.conf"
+        configuration.write_text(BUS_CONFIGURATION.format(path=path), encoding="utf-8")
+        bus = self.start("dbus-daemon", "--nofork", "--print-address", f"--config-file={configuration}",
+                         stdout=subprocess.PIPE, stderr=subprocess.DEVNULL)
+        self.bus = bus.stdout.readline().decode().strip()
+        self.bus_process = bus
+        self.environment["DBUS_SESSION_BUS_ADDRESS"] = self.bus
+
+    def _start_sandbox(self) -> None:
+        with open(self.root / "sandbox.log", "ab") as log:
+            sandbox = self.start("palisade-sandbox", "--configuration", self.configuration / "server.toml",
+                                 stdout=subprocess.PIPE, stderr=log)
+        if not sandbox.stdout.readline():
+            raise RuntimeError((self.root / "sandbox.log").read_text(encoding="utf-8"))
+        self.master_token = (self.root / "runtime/palisade-sandbox/master-token").read_bytes()
+
+    def add_client(self, name: str, program: str | None = None) -> None:
+        """Writes the record of an application; without a program of its own it is the command line under another name."""
+        if program is None:
+            program = str(self.root / "bin" / name)
+            shutil.copy(BUILD / "bin/palisade", program)
+        (self.clients / f"org.example.{name}.toml").write_text(
+            f'bundle_id = "org.example.{name}"\nname = "{name.capitalize()}"\n\n[match]\nexecutable = "{program}"\n',
+            encoding="utf-8")
+
+    def configure(self, **settings) -> None:
+        """Writes accountd.toml."""
+        settings = {"plugins": f"{BUILD}/plugins", "terminal": self.person.path, "keychain": "vault",
+                    "log": self.log_level} | settings
+        (self.configuration / "accountd.toml").write_text(
+            "".join(f'{name} = "{value}"\n' for name, value in settings.items()), encoding="utf-8")
+
+    def start_accountd(self, **more) -> subprocess.Popen:
+        """Starts the daemon and returns when it owns its name; what is called then is answered when it serves."""
+        with Caller(self.bus) as listener:
+            listener.call("org.freedesktop.DBus", "/org/freedesktop/DBus", "org.freedesktop.DBus", "AddMatch", "s",
+                          [f"type='signal',member='NameOwnerChanged',arg0='{NAME}'"])
+            with open(self.root / "accountd.log", "ab") as log:
+                self.accountd = self.start("accountd", stderr=log, **more)
+            while True:
+                try:
+                    change = listener.wait_for(lambda message: message.fields.get(MEMBER) == "NameOwnerChanged", 0.5)
+                    if change.values[2]:
+                        return self.accountd
+                except TimeoutError:
+                    if self.accountd.poll() is not None:
+                        raise RuntimeError(f"accountd ended with {self.accountd.returncode}: {self.daemon_log()}") from None
+
+    def start_vantad(self) -> subprocess.Popen:
+        with open(self.root / "vantad.log", "ab") as log:
+            self.vantad = self.start("vantad", "--keychain", "vault", stderr=log, stdout=log)
+        return self.vantad
+
+    def kill_accountd(self) -> None:
+        self.accountd.send_signal(signal.SIGKILL)
+        self.accountd.wait()
+
+    def daemon_log(self) -> str:
+        return (self.root / "accountd.log").read_text(encoding="utf-8", errors="replace")
+
+    def caller(self) -> Caller:
+        return Caller(self.bus)
+
+    def add_account(self) -> str:
+        with self.caller() as manager:
+            return manager.add_account("ada", self.master_token)
+
+    def sandbox(self, *words) -> str:
+        return self.run("palisade-sandbox", *words).stdout
+
+
+def trial_with_account(**settings) -> Trial:
+    trial = Trial(**settings)
+    try:
+        trial.start_accountd()
+        trial.add_account()
+        return trial
+    except BaseException:
+        trial.close()
+        raise
