@@ -3,6 +3,8 @@
 #
 # A plug-in folder holds the module and, beside it, Resources/LANGUAGE/LC_MESSAGES/Localizable.mo. The same layout is used in the
 # build tree and after installation, so a module finds its texts wherever it is loaded from.
+#
+# Installed as it stands, for plug-ins outside this tree.
 
 set(PALISADE_PLUGIN_BUILD_DIR ${PROJECT_BINARY_DIR}/plugins)
 set(PALISADE_PLUGIN_INSTALL_DIR ${CMAKE_INSTALL_LIBDIR}/palisade/plugins)
@@ -12,8 +14,10 @@ function(palisade_add_plugin name)
   add_library(${name} MODULE ${PLUGIN_UNPARSED_ARGUMENTS})
   set_target_properties(${name} PROPERTIES
     PREFIX ""
+    CXX_VISIBILITY_PRESET hidden
+    VISIBILITY_INLINES_HIDDEN ON
     LIBRARY_OUTPUT_DIRECTORY ${PALISADE_PLUGIN_BUILD_DIR}/${name})
-  target_link_libraries(${name} PRIVATE palisade-platform)
+  target_link_libraries(${name} PRIVATE Palisade::platform)
 
   string(JOIN "; " exports accountAccessPluginModule ${PLUGIN_EXPORTS})
   file(CONFIGURE OUTPUT ${CMAKE_CURRENT_BINARY_DIR}/${name}.map

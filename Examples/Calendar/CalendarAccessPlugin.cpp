@@ -3,7 +3,7 @@
 // A grant comes from the user, from an entitlement or from the daemon, never from a failure: every path that cannot finish ends
 // in a refusal. What nobody answered is not recorded, so the next request asks again.
 
-#include "Examples/Calendar/CalendarAccessPlugin.h"
+#include "CalendarAccessPlugin.h"
 
 #include "Platform/AccountConstants.h"
 #include "Platform/AccountStore.h"

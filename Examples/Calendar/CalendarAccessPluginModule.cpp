@@ -1,6 +1,6 @@
 // What the daemon finds in the module: one function, and through it the account type and the plug-in.
 
-#include "Examples/Calendar/CalendarAccessPlugin.h"
+#include "CalendarAccessPlugin.h"
 
 extern "C" PALISADE_EXPORT const palisade::AccountAccessPluginModule* accountAccessPluginModule(std::uint32_t daemonABINumber);
 

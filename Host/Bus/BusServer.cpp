@@ -145,6 +145,20 @@ class BusServer::Implementation final : private OwnedConnection,
   BusLoop& loop() { return _loop; }
   BusNotifications& notifications() { return _notifications; }
 
+  void start(const std::string& name) {
+    constexpr std::uint32_t noFlags = 0;
+    try {
+      sdbus::createProxy(*_connection, "org.freedesktop.DBus", "/org/freedesktop/DBus")
+          ->callMethod("StartServiceByName")
+          .onInterface("org.freedesktop.DBus")
+          .withArguments(name, noFlags)
+          .dontExpectReply();
+      _loop.wake();
+    } catch (const sdbus::Error&) {
+      // Whoever can start it otherwise will; what it is to do waits in a file.
+    }
+  }
+
  private:
   void RequestAccess(AccessResult&& result, std::string accountType, BusDictionary accessOptions,
                      BusDictionary options) override {
@@ -257,7 +271,7 @@ class BusServer::Implementation final : private OwnedConnection,
       refuseUnknownOptions(options, known);
       const auto reply = std::make_shared<Result>(std::forward<Result>(result));
       BusLoop::defer(
-          [reply, caller = callerOfThisMessage(), work = std::move(work)] { answer(*reply, [&] { return work(caller); }); });
+          [reply, caller = callerOfThisMessage(), work = std::move(work)] { answer(*reply, [&] { return work(*caller); }); });
     });
   }
 
@@ -265,10 +279,11 @@ class BusServer::Implementation final : private OwnedConnection,
   void startRequest(AccessResult&& result, const BusDictionary& options, Work work) {
     checked([&] {
       refuseUnknownOptions(options, {"handle_token"});
-      const BusCaller caller = callerOfThisMessage();
-      const auto request = std::make_shared<BusRequest>(_requests, caller.uniqueName,
+      const auto caller = callerOfThisMessage();
+      const auto request = std::make_shared<BusRequest>(_requests, caller->uniqueName,
                                                         optionOf<std::string>(options, "handle_token"), std::move(result));
-      BusLoop::defer([request, caller, work = std::move(work)] { carryOut(*request, [&] { return work(caller, *request); }); });
+      BusLoop::defer(
+          [request, caller, work = std::move(work)] { carryOut(*request, [&] { return work(*caller, *request); }); });
     });
   }
 
@@ -295,18 +310,18 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
   // Who sent the message that is being handled. The bus is asked once a connection.
-  BusCaller callerOfThisMessage() {
+  std::shared_ptr<const BusCaller> callerOfThisMessage() {
     const sdbus::Message* message = getObject().getCurrentlyProcessedMessage();
     const std::string uniqueName = message->getSender();
     const std::lock_guard lock(_mutex);
     const auto known = _callers.find(uniqueName);
     if (known != _callers.end()) return known->second;
     try {
-      const BusCaller caller{.uniqueName = uniqueName,
-                             .processID = message->getCredsPid(),
-                             .userID = message->getCredsUid(),
-                             .askProcessAgain = [this, uniqueName] { return processOf(uniqueName); }};
-      return _callers.emplace(uniqueName, caller).first->second;
+      BusCaller caller{.uniqueName = uniqueName,
+                       .processID = message->getCredsPid(),
+                       .userID = message->getCredsUid(),
+                       .askProcessAgain = [this, uniqueName] { return processOf(uniqueName); }};
+      return _callers.emplace(uniqueName, std::make_shared<const BusCaller>(std::move(caller))).first->second;
     } catch (const sdbus::Error&) {
       throw BusFailure(BusFailureKind::unknownCaller, "The bus does not say who is calling.");
     }
@@ -340,7 +355,7 @@ class BusServer::Implementation final : private OwnedConnection,
   BusNotifications _notifications;
   RequestObjects _requests;
   std::mutex _mutex;
-  std::map<std::string, BusCaller> _callers;
+  std::map<std::string, std::shared_ptr<const BusCaller>> _callers;
   std::mutex _questionMutex;
   std::unique_ptr<sdbus::IConnection> _questions;
 };
@@ -353,6 +368,8 @@ void BusServer::run() { _implementation->loop().run(); }
 void BusServer::stop() { _implementation->loop().stop(); }
 
 NotificationBus& BusServer::notifications() { return _implementation->notifications(); }
+
+void BusServer::start(const std::string& name) { _implementation->start(name); }
 
 void BusServer::emitAccountsChanged(const std::string& accountType) { _implementation->emitAccountsChanged(accountType); }
 

@@ -28,6 +28,10 @@ class BusServer {
   /// The notification bus on the same connection.
   NotificationBus& notifications();
 
+  /// Has the bus start the program that owns `name`, unless it runs; nobody waits for it, and a bus that knows no such program
+  /// starts none. From any thread.
+  void start(const std::string& name);
+
   void emitAccountsChanged(const std::string& accountType);
   void emitGrantsChanged(const std::string& accountType, const std::string& client);
 

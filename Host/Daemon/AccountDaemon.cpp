@@ -8,10 +8,13 @@
 #include "Host/Accounts/ClientDirectory.h"
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Alert/TerminalAlert.h"
+#include "Host/Bus/BusLoop.h"
+#include "Host/Bus/BusPresence.h"
 #include "Host/Bus/BusServer.h"
 #include "Host/Daemon/AccountOperations.h"
 #include "Host/Daemon/AlertScheduler.h"
 #include "Host/Daemon/CrashRepair.h"
+#include "Host/Daemon/HealthChecks.h"
 #include "Host/Daemon/OperationKeychain.h"
 #include "Host/Daemon/Paths.h"
 #include "Host/Daemon/PluginHost.h"
@@ -40,7 +43,7 @@ std::optional<std::filesystem::path> credentialsFolder() {
 }
 
 ServerConfiguration serverConfiguration() {
-  const auto file = configurationFolder() / "server.toml";
+  const auto file = configurationFile("server.toml");
   const auto table = readTomlFile(file);
   if (!table) return {};
   try {
@@ -82,7 +85,7 @@ struct AccountDaemon::Parts {
                                          .keyFile = stateFolder() / "vault.key",
                                          .credentialsFolder = credentialsFolder()},
                                .choiceFile = stateFolder() / "keychain"})),
-        outbox({.path = stateFolder() / "outbox.sqlite"}),
+        outbox({.path = stateFolder() / "outbox.sqlite", .onAdd = [this] { bus.start(socialDaemonBusName); }}),
         server(serverConfiguration()),
         http(server.httpOptions()),
         social(http, outbox, FacebookServer(server), [this] { return firstFacebookAccount(); }),
@@ -101,6 +104,7 @@ struct AccountDaemon::Parts {
         bus(service) {
     // Only the owner of the bus name may repair: another daemon could be in the middle of a grant.
     for (const std::string& sentence : repairAfterCrash(store, *keychain, outbox)) tell(sentence);
+    if (!outbox.pending().empty()) bus.start(socialDaemonBusName);
     plugins.emplace(configuration.plugins, PlatformServices{.log = &log,
                                                             .keychain = &pluginKeychain,
                                                             .social = &social,
@@ -147,6 +151,8 @@ struct AccountDaemon::Parts {
   }
 
   Dictionary status() {
+    // What is tried takes its time.
+    BusLoop::handOver();
     Array modules;
     for (const std::string& module : plugins->modules()) modules.emplace_back(module);
     Dictionary report{{"plugins", modules},
@@ -163,9 +169,12 @@ struct AccountDaemon::Parts {
       report.set("alert_trouble",
                  "Nobody can be asked. Start accountd with --terminal \"$(tty)\", or set terminal in accountd.toml.");
     }
+    if (const auto trouble = troubleWithKeychain(*keychain)) report.set("keychain_trouble", *trouble);
     if (server.address.empty()) {
       report.set("server_trouble", "No server is configured. Write address = \"https://…\" into " +
                                        (configurationFolder() / "server.toml").string() + ".");
+    } else if (const auto trouble = troubleWithServer(server)) {
+      report.set("server_trouble", *trouble);
     }
     return report;
   }

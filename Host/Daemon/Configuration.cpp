@@ -17,7 +17,7 @@ called; see com.veltran.Accounts1 there, and palisade(1) for people.
   -h, --help            show this
   --version             show the version
 
-The same names can stand in accountd.toml in $XDG_CONFIG_HOME/palisade: keychain = "vault"
+The same names can stand in accountd.toml in $XDG_CONFIG_HOME/palisade, or in /etc/xdg/palisade for everybody: keychain = "vault"
 The server's address stands in server.toml beside it.
 )";
 

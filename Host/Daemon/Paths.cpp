@@ -4,6 +4,7 @@
 #include <sstream>
 #include <stdexcept>
 #include <string>
+#include <system_error>
 
 namespace palisade {
 namespace {
@@ -22,20 +23,38 @@ std::filesystem::path baseDirectory(const char* variable, const char* belowHome)
   return home / belowHome / "palisade";
 }
 
+// The "palisade" folders of a list of base directories; those that are not absolute are to be ignored.
+std::vector<std::filesystem::path> searchedFolders(const char* variable, const char* otherwise) {
+  std::string directories = environment(variable);
+  if (directories.empty()) directories = otherwise;
+  std::vector<std::filesystem::path> folders;
+  std::istringstream list(directories);
+  for (std::string directory; std::getline(list, directory, ':');) {
+    if (std::filesystem::path(directory).is_absolute()) folders.push_back(std::filesystem::path(directory) / "palisade");
+  }
+  return folders;
+}
+
 }  // namespace
 
 std::filesystem::path stateFolder() { return baseDirectory("XDG_STATE_HOME", ".local/state"); }
 std::filesystem::path configurationFolder() { return baseDirectory("XDG_CONFIG_HOME", ".config"); }
 
+std::filesystem::path configurationFile(const std::string& name) {
+  const std::filesystem::path own = configurationFolder() / name;
+  std::error_code error;
+  if (std::filesystem::exists(own, error)) return own;
+  for (const auto& folder : searchedFolders("XDG_CONFIG_DIRS", "/etc/xdg")) {
+    if (std::filesystem::exists(folder / name, error)) return folder / name;
+  }
+  return own;
+}
+
 std::vector<std::filesystem::path> clientRecordFolders() {
   std::vector<std::filesystem::path> folders{"/etc/palisade/clients",
                                              baseDirectory("XDG_DATA_HOME", ".local/share") / "clients"};
-  std::string dataFolders = environment("XDG_DATA_DIRS");
-  if (dataFolders.empty()) dataFolders = "/usr/local/share:/usr/share";
-  std::istringstream list(dataFolders);
-  for (std::string folder; std::getline(list, folder, ':');) {
-    if (std::filesystem::path(folder).is_absolute()) folders.push_back(std::filesystem::path(folder) / "palisade/clients");
-  }
+  for (const auto& folder : searchedFolders("XDG_DATA_DIRS", "/usr/local/share:/usr/share"))
+    folders.push_back(folder / "clients");
   return folders;
 }
 

@@ -5,6 +5,7 @@
 /// Threads: pure functions over the environment. Errors: `std::runtime_error` when the user has no home.
 
 #include <filesystem>
+#include <string>
 #include <vector>
 
 namespace palisade {
@@ -14,6 +15,10 @@ std::filesystem::path stateFolder();
 
 /// What a person writes: server.toml, accountd.toml, preferences/DOMAIN.toml.
 std::filesystem::path configurationFolder();
+
+/// The person's own file of this name; the administrator's, below $XDG_CONFIG_DIRS, when the person has none. Where the
+/// person's would stand when there is neither.
+std::filesystem::path configurationFile(const std::string& name);
 
 /// Client records: the administrator's, the user's own, the system's.
 std::vector<std::filesystem::path> clientRecordFolders();

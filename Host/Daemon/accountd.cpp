@@ -41,6 +41,11 @@ void stopWhenSignalled(AccountDaemon& daemon, sigset_t signals) {
   }).detach();
 }
 
+// The plug-ins that were installed with this daemon, wherever that was.
+std::filesystem::path installedPlugins() {
+  return (std::filesystem::read_symlink("/proc/self/exe").parent_path() / PALISADE_PLUGIN_FOLDER).lexically_normal();
+}
+
 int serve(const palisade::DaemonConfiguration& configuration) {
   const sigset_t signals = blockEndingSignals();
   AccountDaemon daemon(configuration);
@@ -53,8 +58,8 @@ int serve(const palisade::DaemonConfiguration& configuration) {
 
 int main(int argumentCount, char** arguments) {
   try {
-    palisade::DaemonConfiguration configuration{.plugins = PALISADE_PLUGIN_FOLDER};
-    if (const auto table = palisade::readTomlFile(palisade::configurationFolder() / "accountd.toml")) {
+    palisade::DaemonConfiguration configuration{.plugins = installedPlugins()};
+    if (const auto table = palisade::readTomlFile(palisade::configurationFile("accountd.toml"))) {
       palisade::applyConfigurationFile(*table, configuration);
     }
     switch (palisade::applyCommandLine(argumentCount, arguments, configuration)) {

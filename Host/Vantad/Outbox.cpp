@@ -142,6 +142,7 @@ void Outbox::add(std::string_view accountID, std::string_view appID) {
     writer.add.execute(accountID, appID, secondsOf(now.date), now.boot, now.uptime.count());
   });
   ring();
+  if (_options.onAdd) _options.onAdd();
 }
 
 std::vector<Invalidation> Outbox::pending() {

@@ -12,6 +12,7 @@
 #include <chrono>
 #include <cstdint>
 #include <filesystem>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
@@ -53,6 +54,8 @@ struct OutboxOptions {
   std::filesystem::path path;
   DamagedStore onDamage = DamagedStore::refuse;
   Clock clock = presentMoment;
+  /// Called when something has been added, on the thread that added it.
+  std::function<void()> onAdd = nullptr;
 };
 
 class Outbox {

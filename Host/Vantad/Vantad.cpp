@@ -44,6 +44,7 @@ Vantad::Vantad(const VantadOptions& options, Log& log)
       _log(log),
       _outbox({.path = _options.outbox()}),
       _instance(_options.lock()),
+      _bus(socialDaemonBusName),
       _bell(Outbox::bellOf(_options.outbox())),
       _configurationFile(_options.configuration),
       _signals(openSignals()),
@@ -89,13 +90,14 @@ Vantad::Reason Vantad::serve(const ServerConfiguration& configuration) {
                    .random = [&generator] { return std::generate_canonical<double, 32>(generator); }});
   while (true) {
     const auto wait = advance(courier);
-    std::array<pollfd, 5> events = {{{.fd = _signals, .events = POLLIN, .revents = 0},
+    std::array<pollfd, 6> events = {{{.fd = _signals, .events = POLLIN, .revents = 0},
                                      {.fd = _configurationFile.descriptor(), .events = POLLIN, .revents = 0},
                                      {.fd = _network.descriptor(), .events = POLLIN, .revents = 0},
                                      {.fd = _bell.descriptor(), .events = POLLIN, .revents = 0},
-                                     {.fd = _answers, .events = POLLIN, .revents = 0}}};
+                                     {.fd = _answers, .events = POLLIN, .revents = 0},
+                                     {.fd = _bus.descriptor(), .events = POLLIN, .revents = 0}}};
     poll(events.data(), events.size(), pollTimeout(wait));
-    if (events[0].revents != 0) return Reason::end;
+    if (events[0].revents != 0 || !_bus.serve()) return Reason::end;
     if (_configurationFile.hasChanged()) return Reason::configuration;
     if (_network.hasImproved()) courier.hurry();
     _bell.hasChanged();

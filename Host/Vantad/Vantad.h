@@ -8,6 +8,7 @@
 #include <chrono>
 #include <optional>
 
+#include "Host/Bus/BusPresence.h"
 #include "Host/Http/HttpClient.h"
 #include "Host/Json/Json.h"
 #include "Host/Social/FacebookServer.h"
@@ -28,7 +29,7 @@ class Vantad {
   Vantad& operator=(const Vantad&) = delete;
   ~Vantad();
 
-  /// Returns after SIGTERM or SIGINT.
+  /// Returns after SIGTERM or SIGINT, and with the session bus if there was one.
   void run();
 
  private:
@@ -42,6 +43,7 @@ class Vantad {
   Log& _log;
   Outbox _outbox;
   SingleInstance _instance;
+  BusPresence _bus;
   FileWatch _bell;
   FileWatch _configurationFile;
   NetworkWatch _network;

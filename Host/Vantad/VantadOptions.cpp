@@ -13,16 +13,18 @@ namespace {
 constexpr const char* help = R"(Usage: vantad [OPTION...]
 
 The social daemon: asks the Facebook server to make tokens invalid whose clients have lost their access, and asks again until
-the server has confirmed it. It runs until SIGTERM or SIGINT, one process for each state directory.
+the server has confirmed it. It runs until SIGTERM or SIGINT, or the end of the session, one process
+for each state directory; the account daemon has the session bus start it when there is something to do.
 
   --state DIRECTORY       where the outbox and the vault are (default: $XDG_STATE_HOME/palisade, else ~/.local/state/palisade)
-  --configuration FILE    where the server is (default: $XDG_CONFIG_HOME/palisade/server.toml, else under ~/.config)
+  --configuration FILE    where the server is (default: $XDG_CONFIG_HOME/palisade/server.toml, else the administrator's, in
+                          /etc/xdg/palisade)
   --keychain CHOICE       automatic, secret-service or vault
   --log LEVEL             error, notice or debug
   -h, --help              show this
   --version               show the version
 
-What --keychain and --log leave open is taken from accountd.toml beside server.toml. server.toml needs one line,
+What --keychain and --log leave open is taken from accountd.toml, found likewise. server.toml needs one line,
 address = "https://HOST"; it is read again whenever it changes.
 )";
 
@@ -88,7 +90,12 @@ VantadOptions parseVantadOptions(int count, char** words) {
   }
   if (optind < count) throw std::invalid_argument("A word too many: " + std::string(words[optind]) + ".");
   if (options.state.empty()) options.state = stateFolder();
-  if (options.configuration.empty()) options.configuration = configurationFolder() / "server.toml";
+  if (options.configuration.empty()) {
+    options.configuration = configurationFile("server.toml");
+    options.accountdConfiguration = configurationFile("accountd.toml");
+  } else {
+    options.accountdConfiguration = options.configuration.parent_path() / "accountd.toml";
+  }
   return options;
 }
 

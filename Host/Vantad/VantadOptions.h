@@ -19,8 +19,10 @@ struct VantadOptions {
 
   Request request = Request::serve;
   std::filesystem::path state;
-  /// server.toml; accountd.toml stands beside it.
+  /// server.toml.
   std::filesystem::path configuration;
+  /// accountd.toml: beside a server.toml that was named, otherwise wherever the account daemon finds it.
+  std::filesystem::path accountdConfiguration;
   std::optional<KeychainChoice> keychain;
   std::optional<LogLevel> logLevel;
 
@@ -29,7 +31,6 @@ struct VantadOptions {
 
   std::filesystem::path outbox() const { return state / "outbox.sqlite"; }
   std::filesystem::path lock() const { return state / "vantad.lock"; }
-  std::filesystem::path accountdConfiguration() const { return configuration.parent_path() / "accountd.toml"; }
   KeychainOptions keychainOptions() const;
 };
 

@@ -32,11 +32,18 @@ def library_of(rules, header):
     return None, []
 
 
+def from_the_top(rules, name, header):
+    """The path from the top of what `name` includes as `header`."""
+    root = next((root for root in rules.get("roots", []) if holds(root, name)), None)
+    return header if root is None or "/" in header else f"{root}/{header}"
+
+
 def problem_with(root, rules, name, header, quoted):
     """What is wrong with `name` including `header`, or None."""
     if header is None:
         return "names what it includes through a macro, so that nobody can check it"
     if quoted:
+        header = from_the_top(rules, name, header)
         is_generated = any(fnmatch.fnmatchcase(header, pattern) for pattern in rules["generated"])
         if not is_generated and not (root / header).is_file():
             return f'includes "{header}", which is no file of the project by its path from the top'
