@@ -4,6 +4,7 @@
 #include <sdbus-c++/sdbus-c++.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <chrono>
 #include <condition_variable>
 #include <map>
@@ -20,17 +21,30 @@ constexpr const char* busName = "com.veltran.Accounts1";
 constexpr const char* objectPath = "/com/veltran/Accounts1";
 constexpr const char* requestInterface = "com.veltran.Accounts1.Request";
 
+// What to do about the errors of the daemon whose own sentence does not say.
+constexpr std::pair<std::string_view, std::string_view> nextSteps[] = {
+    {"NotGranted", " `palisade request --help` says how an application asks."},
+    {"NotPermitted", " Run it outside the sandbox."},
+    {"TooManyRequests", " Wait for the earlier ones to be answered."},
+    {"UnknownCaller", " `palisade clients` shows the applications that are known."},
+    {"KeychainUnavailable", " `palisade doctor` examines the keychain."},
+    {"StoreUnavailable", " `palisade doctor` examines the store."},
+};
+
+std::string_view nextStepAfter(std::string_view errorName) {
+  const auto* const step = std::ranges::find(nextSteps, errorName, &std::pair<std::string_view, std::string_view>::first);
+  return step == std::end(nextSteps) ? "" : step->second;
+}
+
 // A sentence for the errors that the bus itself makes; the daemon's own errors bring theirs.
 CallFailed failureOf(const sdbus::Error& error) {
   const std::string name = error.getName().substr(error.getName().rfind('.') + 1);
   if (name == "ServiceUnknown" || name == "NameHasNoOwner") {
     return {name, "The account daemon does not run and could not be started. `palisade doctor` says what is missing."};
   }
-  if (name == "NoReply" || name == "Timeout" || name == "TimedOut") return {name, "The account daemon did not answer in time."};
-  if (name == "FileNotFound" || name == "NoServer") {
-    return {name, "There is no session bus. Log in to a session, or try `dbus-run-session -- sh`."};
-  }
-  return {name, error.getMessage().empty() ? error.getName() : error.getMessage()};
+  if (name == "NoReply" || name == "Timeout" || name == "TimedOut")
+    return {name, "The account daemon did not answer in time. `palisade doctor` says what it waits for."};
+  return {name, (error.getMessage().empty() ? error.getName() : error.getMessage()) + std::string(nextStepAfter(name))};
 }
 
 template <typename Call>
@@ -79,6 +93,18 @@ class AccountsClient::Bus {
   ~Bus() { _connection->leaveEventLoop(); }
 
   Manager& manager() { return _manager; }
+
+  bool hasOwner(const std::string& name) {
+    bool isOwned = false;
+    bus()->callMethod("NameHasOwner").onInterface("org.freedesktop.DBus").withArguments(name).storeResultsTo(isOwned);
+    return isOwned;
+  }
+
+  std::vector<std::string> startableNames() {
+    std::vector<std::string> names;
+    bus()->callMethod("ListActivatableNames").onInterface("org.freedesktop.DBus").storeResultsTo(names);
+    return names;
+  }
   sdbus::IConnection& connection() { return *_connection; }
 
   // Calls with a handle token, and waits for the Response signal if the request has to wait for somebody. The subscription
@@ -108,7 +134,7 @@ class AccountsClient::Bus {
     std::unique_lock lock(mutex);
     while (!answer) {
       // Without the daemon the signal will never come.
-      if (hasAnswer.wait_for(lock, std::chrono::seconds(1)) == std::cv_status::timeout && !daemonRuns()) {
+      if (hasAnswer.wait_for(lock, std::chrono::seconds(1)) == std::cv_status::timeout && !hasOwner(busName)) {
         throw CallFailed("NoReply", "The account daemon ended before the request was answered. Nothing was granted.");
       }
     }
@@ -116,18 +142,22 @@ class AccountsClient::Bus {
   }
 
  private:
-  bool daemonRuns() {
-    const auto bus = sdbus::createProxy(*_connection, "org.freedesktop.DBus", "/org/freedesktop/DBus");
-    bool hasOwner = false;
-    bus->callMethod("NameHasOwner").onInterface("org.freedesktop.DBus").withArguments(busName).storeResultsTo(hasOwner);
-    return hasOwner;
+  std::unique_ptr<sdbus::IProxy> bus() {
+    return sdbus::createProxy(*_connection, "org.freedesktop.DBus", "/org/freedesktop/DBus");
   }
 
   std::unique_ptr<sdbus::IConnection> _connection;
   Manager _manager;
 };
 
-AccountsClient::AccountsClient() : _bus(checked([] { return std::make_unique<Bus>(); })) {}
+AccountsClient::AccountsClient() {
+  try {
+    _bus = std::make_unique<Bus>();
+  } catch (const sdbus::Error&) {
+    throw CallFailed("NoSessionBus", "There is no session bus. Log in to a session, or try `dbus-run-session -- sh`.");
+  }
+}
+
 AccountsClient::~AccountsClient() = default;
 
 AccessAnswer AccountsClient::requestAccess(const std::string& accountType, const Dictionary& accessOptions,
@@ -214,6 +244,14 @@ void AccountsClient::setPreference(const std::string& domain, const std::string&
 
 Dictionary AccountsClient::status() {
   return checked([&] { return dictionaryFromBus(_bus->manager().GetStatus({})); });
+}
+
+ServiceState AccountsClient::serviceState(const std::string& name) {
+  return checked([&] {
+    if (_bus->hasOwner(name)) return ServiceState::runs;
+    const auto names = _bus->startableNames();
+    return std::ranges::find(names, name) == names.end() ? ServiceState::unknown : ServiceState::canBeStarted;
+  });
 }
 
 void AccountsClient::notify(const std::string& name) {

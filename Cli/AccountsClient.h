@@ -36,6 +36,9 @@ struct AccessAnswer {
   Dictionary results;
 };
 
+/// Of a program that is known by a name on the bus.
+enum class ServiceState { runs, canBeStarted, unknown };
+
 class AccountsClient {
  public:
   AccountsClient();
@@ -62,6 +65,7 @@ class AccountsClient {
   std::optional<Value> preference(const std::string& domain, const std::string& key);
   void setPreference(const std::string& domain, const std::string& key, const std::optional<Value>& value);
   Dictionary status();
+  ServiceState serviceState(const std::string& busName);
 
   /// Posts a notification to whoever listens.
   void notify(const std::string& name);

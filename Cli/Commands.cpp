@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <charconv>
+#include <csignal>
 #include <iostream>
 
 #include "Platform/AccountConstants.h"
@@ -15,17 +16,29 @@ namespace {
 constexpr int yes = 0;
 constexpr int no = 1;
 
+termios shownSettings{};
+
+void showAgain() { tcsetattr(STDIN_FILENO, TCSAFLUSH, &shownSettings); }
+
+// Whoever is interrupted at the prompt finds the terminal as it was.
+extern "C" void showAgainAndEnd(int signal) {
+  showAgain();
+  std::signal(signal, SIG_DFL);
+  std::raise(signal);
+}
+
 // Reads one line without showing it.
 std::string readSecretFromTerminal(std::string_view prompt) {
-  fmt::print(stderr, "{}", prompt);
-  termios shownSettings{};
   tcgetattr(STDIN_FILENO, &shownSettings);
+  for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGQUIT}) std::signal(signal, showAgainAndEnd);
   termios hidden = shownSettings;
   hidden.c_lflag &= ~static_cast<tcflag_t>(ECHO);
   tcsetattr(STDIN_FILENO, TCSAFLUSH, &hidden);
+  fmt::print(stderr, "{}", prompt);
   std::string secret;
   std::getline(std::cin, secret);
-  tcsetattr(STDIN_FILENO, TCSAFLUSH, &shownSettings);
+  showAgain();
+  for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGQUIT}) std::signal(signal, SIG_DFL);
   fmt::print(stderr, "\n");
   return secret;
 }
@@ -78,7 +91,10 @@ int listAccounts(AccountsClient& client, const Output& output, const std::string
 }
 
 int addAccount(AccountsClient& client, const Output& output, const std::string& accountType, const std::string& username) {
-  const std::string id = client.addAccount(accountType, username, readToken());
+  const std::string token = readToken();
+  if (token.empty())
+    throw std::runtime_error("There is no token on standard input. Try: palisade account add USER < token-file");
+  const std::string id = client.addAccount(accountType, username, token);
   output.say(fmt::format("Added account {} for {}.", id, username), {{"id", id}});
   return yes;
 }
@@ -159,7 +175,8 @@ int listClients(AccountsClient& client, const Output& output) {
   output.list(
       client.listClients(),
       {{"BUNDLE ID", "bundle_id"}, {"NAME", "name"}, {"CLASS", "class"}, {"ENTITLEMENTS", "entitlements"}, {"FILE", "file"}},
-      "There are no client records. They stand in $XDG_DATA_HOME/palisade/clients and /usr/share/palisade/clients.");
+      "There are no client records. They stand in $XDG_DATA_HOME/palisade/clients and /usr/share/palisade/clients; "
+      "man palisade-clients says what is in them.");
   return yes;
 }
 
@@ -184,46 +201,6 @@ int notify(AccountsClient& client, const Output& output, const std::string& name
   client.notify(name);
   output.say(fmt::format("Posted {}.", name), {{"posted", name}});
   return yes;
-}
-
-int examine(const Output& output) {
-  struct Check {
-    const char* key;
-    const char* title;
-  };
-  constexpr Check checks[] = {{"plugins", "plug-ins"}, {"clients", "client records"}, {"keychain", "keychain"},
-                              {"alert", "alert"},      {"server", "server"},          {"store", "store"},
-                              {"log", "log"}};
-  Dictionary status;
-  try {
-    status = AccountsClient().status();
-    status.set("bus", "session bus, daemon answers");
-  } catch (const CallFailed& failure) {
-    status.set("bus", "no answer");
-    status.set("bus_trouble", failure.what());
-  }
-
-  const auto trouble = [&](const std::string& key) { return status.find(key + "_trouble"); };
-  bool isWell = trouble("bus") == nullptr;
-  for (const Check& check : checks) isWell = isWell && trouble(check.key) == nullptr;
-  if (output.isJson()) {
-    status.set("well", isWell);
-    output.say("", status);
-    return isWell ? yes : no;
-  }
-
-  const auto tell = [&](const std::string& key, const std::string& title) {
-    const Value* value = status.find(key);
-    if (value == nullptr) return;
-    const bool isBad = trouble(key) != nullptr;
-    const std::string mark = isBad ? "✗" : "✓";
-    const std::string coloured = output.isColoured() ? fmt::format("\x1b[{}m{}\x1b[0m", isBad ? 31 : 32, mark) : mark;
-    fmt::print("{} {:<15}{}\n", coloured, title, shown(value));
-    if (isBad) fmt::print("  {:<15}{}\n", "", shown(trouble(key)));
-  };
-  tell("bus", "bus");
-  for (const Check& check : checks) tell(check.key, check.title);
-  return isWell ? yes : no;
 }
 
 }  // namespace palisade

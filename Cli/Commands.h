@@ -41,7 +41,4 @@ int setPreference(AccountsClient& client, const Output& output, const std::strin
                   const std::optional<std::string>& value);
 int notify(AccountsClient& client, const Output& output, const std::string& name);
 
-/// Checks what the daemon runs on, and says what to do about what is missing. Also when there is no daemon.
-int examine(const Output& output);
-
 }  // namespace palisade

@@ -4,19 +4,37 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <cwchar>
+#include <cwctype>
 
 namespace palisade {
 namespace {
 
+// Characters that would turn the direction of the rest of the line.
+bool turnsDirection(wchar_t character) {
+  return (character >= 0x202A && character <= 0x202E) || (character >= 0x2066 && character <= 0x2069);
+}
+
+// The text with a "?" for whatever is no character, or moves the cursor or the text around it.
 std::string printable(const std::string& text) {
-  std::string result = text;
-  for (char& character : result) {
-    if (static_cast<unsigned char>(character) < 0x20 || character == 0x7F) character = '?';
+  std::string result;
+  std::mbstate_t state{};
+  for (std::size_t position = 0; position < text.size();) {
+    wchar_t character = 0;
+    const std::size_t length = std::mbrtowc(&character, &text[position], text.size() - position, &state);
+    const bool isCharacter = length > 0 && length <= text.size() - position;
+    if (isCharacter && std::iswprint(static_cast<wint_t>(character)) != 0 && !turnsDirection(character)) {
+      result.append(text, position, length);
+    } else {
+      result += '?';
+    }
+    if (!isCharacter) state = {};
+    position += isCharacter ? length : 1;
   }
   return result;
 }
 
-// Columns on the screen. Text that the locale cannot read is counted by bytes.
+// Columns on the screen, of printable text.
 std::size_t widthOf(const std::string& text) {
   std::wstring wide(text.size(), L'\0');
   const std::size_t length = std::mbstowcs(wide.data(), text.c_str(), wide.size());
