@@ -1,0 +1,157 @@
+// The window's behaviour: what input reaches it, and when a button counts as pressed. How it looks is in AlertWindowLayout.cpp.
+//
+// Every event passes `filterEvent` before a widget sees it, so that `Arming` knows of all clicks and keys, wherever they go.
+// Return and Space never reach the buttons: what they press is decided here, when they are let go.
+
+#include "AlertHelper/AlertWindow.h"
+
+#include <gdk/gdkkeysyms.h>
+#include <glibmm/main.h>
+#include <gtk/gtk.h>
+#include <gtkmm/adjustment.h>
+
+#include "AlertHelper/Layer.h"
+#include "AlertHelper/PressedKeys.h"
+
+namespace palisade {
+namespace {
+
+constexpr unsigned lookEvery = 50;
+
+bool isPressingKey(unsigned symbol) {
+  return symbol == GDK_KEY_Return || symbol == GDK_KEY_KP_Enter || symbol == GDK_KEY_ISO_Enter || symbol == GDK_KEY_space ||
+         symbol == GDK_KEY_KP_Space;
+}
+
+}  // namespace
+
+AlertWindow::AlertWindow(const AlertQuestion& question, std::function<void(AlertWord)> answer)
+    : _answer(std::move(answer)),
+      _isTopMost(question.topMost),
+      _arming([] { return std::chrono::steady_clock::now(); }) {
+  build(question);
+  _refuse.signal_clicked().connect([this] { this->answer(AlertWord::refused); });
+  _allow.signal_clicked().connect([this] { allowClicked(); });
+  signal_delete_event().connect([this](GdkEventAny*) {
+    this->answer(AlertWord::closed);
+    return true;
+  });
+  property_is_active().signal_changed().connect([this] { updateCondition(); });
+  gdk_event_handler_set(&AlertWindow::filter, this, nullptr);
+}
+
+AlertWindow::~AlertWindow() {
+  gdk_event_handler_set([](GdkEvent* event, void*) { gtk_main_do_event(event); }, nullptr, nullptr);
+}
+
+void AlertWindow::appear() {
+  set_modal(true);
+  set_keep_above(_isTopMost);
+  set_type_hint(Gdk::WINDOW_TYPE_HINT_DIALOG);
+  set_position(Gtk::WIN_POS_CENTER);
+  add_events(Gdk::VISIBILITY_NOTIFY_MASK);
+  _isLayer = _isTopMost && becomeLayer(*gobj());
+  if (_isLayer) get_style_context()->add_class("layer");
+  Glib::signal_timeout().connect([this] { return showWhetherArmed(); }, lookEvery);
+  showWhetherArmed();
+  show_all();
+  _allow.grab_focus();
+  present();
+}
+
+void AlertWindow::filter(GdkEvent* event, void* window) { static_cast<AlertWindow*>(window)->filterEvent(event); }
+
+void AlertWindow::filterEvent(GdkEvent* event) {
+  const bool isOurs = get_window() && event->any.window != nullptr &&
+                      gdk_window_get_effective_toplevel(event->any.window) == get_window()->gobj();
+  switch (event->type) {
+    case GDK_KEY_PRESS:
+      if (!keyWentDown(event->key)) return;
+      break;
+    case GDK_KEY_RELEASE:
+      if (!keyWentUp(event->key)) return;
+      break;
+    case GDK_BUTTON_PRESS:
+    case GDK_2BUTTON_PRESS:
+    case GDK_3BUTTON_PRESS:
+    case GDK_TOUCH_BEGIN:
+      _isPointerDown = true;
+      _arming.pointerWentDown();
+      break;
+    case GDK_VISIBILITY_NOTIFY:
+      if (isOurs) _arming.setCovered(event->visibility.state != GDK_VISIBILITY_UNOBSCURED);
+      break;
+    case GDK_MAP: _arming.setVisible(true); break;
+    case GDK_UNMAP: _arming.setVisible(false); break;
+    case GDK_WINDOW_STATE:
+      if (isOurs) {
+        const unsigned hidden = GDK_WINDOW_STATE_ICONIFIED | GDK_WINDOW_STATE_WITHDRAWN;
+        _arming.setVisible((event->window_state.new_window_state & hidden) == 0 && get_mapped());
+      }
+      break;
+    default: break;
+  }
+  const GdkEventType type = event->type;
+  gtk_main_do_event(event);
+  if (type == GDK_BUTTON_RELEASE || type == GDK_TOUCH_END || type == GDK_TOUCH_CANCEL) _isPointerDown = false;
+}
+
+// Whether a widget may see the key.
+bool AlertWindow::keyWentDown(const GdkEventKey& key) {
+  const bool isFresh = _arming.keyWentDown(key.hardware_keycode);
+  if (key.keyval == GDK_KEY_Page_Up || key.keyval == GDK_KEY_Page_Down) scroll(key.keyval == GDK_KEY_Page_Up ? -1 : 1);
+  return isFresh && key.keyval != GDK_KEY_Escape && !isPressingKey(key.keyval);
+}
+
+bool AlertWindow::keyWentUp(const GdkEventKey& key) {
+  const Arming::Press press = _arming.keyWentUp(key.hardware_keycode);
+  if (key.keyval != GDK_KEY_Escape && !isPressingKey(key.keyval)) return true;
+  if (press == Arming::Press::none) return false;
+  if (key.keyval == GDK_KEY_Escape) {
+    answer(AlertWord::closed);
+  } else if (get_focus() == &_refuse) {
+    answer(AlertWord::refused);
+  } else if (press == Arming::Press::armed) {
+    answer(AlertWord::allowed);
+  }
+  return false;
+}
+
+void AlertWindow::allowClicked() {
+  const Arming::Press press = _isPointerDown ? _arming.pointerWentUp() : _arming.pressedAtOnce();
+  if (press == Arming::Press::armed) answer(AlertWord::allowed);
+}
+
+void AlertWindow::scroll(int pages) {
+  const auto place = _scroller.get_vadjustment();
+  place->set_value(place->get_value() + pages * place->get_page_increment());
+}
+
+// There is one answer: whatever is pressed while the window goes away was pressed too late.
+void AlertWindow::answer(AlertWord word) {
+  if (const auto first = std::exchange(_answer, nullptr)) first(word);
+}
+
+void AlertWindow::updateCondition() {
+  const bool hasFocus = property_is_active().get_value();
+  if (hasFocus == _hadFocus) return;
+  _hadFocus = hasFocus;
+  if (hasFocus) {
+    _arming.focusCame(pressedKeys(get_display()->gobj()));
+  } else {
+    _arming.focusWent();
+  }
+}
+
+// The button looks as it behaves. It stays sensitive, so that the keyboard's focus can rest on it.
+bool AlertWindow::showWhetherArmed() {
+  const auto style = _allow.get_style_context();
+  if (_arming.isArmed() && style->has_class("waiting")) {
+    style->remove_class("waiting");
+  } else if (!_arming.isArmed() && !style->has_class("waiting")) {
+    style->add_class("waiting");
+  }
+  return true;
+}
+
+}  // namespace palisade

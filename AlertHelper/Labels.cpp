@@ -1,0 +1,34 @@
+#include "AlertHelper/Labels.h"
+
+namespace palisade {
+namespace {
+
+bool isLatinLetter(char byte) { return (byte >= 'a' && byte <= 'z') || (byte >= 'A' && byte <= 'Z'); }
+char lowerCase(char letter) { return static_cast<char>(letter | 0x20); }
+
+// The first letter but `taken` is the one that is chosen.
+std::string labelled(const std::string& text, char taken, char& chosen) {
+  std::string label;
+  for (const char byte : text) {
+    if (chosen == 0 && isLatinLetter(byte) && lowerCase(byte) != taken) {
+      chosen = lowerCase(byte);
+      label += '_';
+    }
+    label += byte;
+    if (byte == '_') label += byte;
+  }
+  return label;
+}
+
+}  // namespace
+
+ButtonLabels buttonLabels(const std::string& refuse, const std::string& allow) {
+  char allowLetter = 0;
+  char refuseLetter = 0;
+  ButtonLabels labels;
+  labels.allow = labelled(allow, 0, allowLetter);
+  labels.refuse = labelled(refuse, allowLetter, refuseLetter);
+  return labels;
+}
+
+}  // namespace palisade

@@ -1,0 +1,20 @@
+#pragma once
+
+/// The buttons' labels: their texts with the letter underlined that presses them together with Alt.
+///
+/// Threads: a pure function. Errors: a text without a letter of its own gets none.
+
+#include <string>
+
+namespace palisade {
+
+struct ButtonLabels {
+  std::string refuse;
+  std::string allow;
+};
+
+/// The letters differ from each other and are plain Latin ones, which every keyboard can type. "_" stands before the letter;
+/// an underscore of the text is doubled.
+ButtonLabels buttonLabels(const std::string& refuse, const std::string& allow);
+
+}  // namespace palisade

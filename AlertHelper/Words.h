@@ -1,0 +1,25 @@
+#pragma once
+
+/// The window's own few words, in the languages of the sentences that it shows.
+///
+/// Threads: a pure function over constants. Errors: a language without words gets English ones.
+
+#include <string_view>
+
+namespace palisade {
+
+struct Words {
+  std::string_view language;
+  std::string_view application;
+  std::string_view account;
+  std::string_view identity;
+  std::string_view certain;
+  std::string_view claimed;
+
+  bool isRightToLeft() const { return language == "ar" || language == "he"; }
+};
+
+/// `languages` are catalogue names, best first, separated by colons.
+const Words& wordsFor(std::string_view languages);
+
+}  // namespace palisade
