@@ -94,7 +94,7 @@ TEST_P(ConsentMessages, AreWrittenToAFileForPeopleToRead) {
 
 TEST_P(ConsentMessages, ReadLikeSentences) {
   for (const Message& message : allMessages()) {
-    EXPECT_THAT(flawsOf(message.text, appName), IsEmpty()) << message.title << '\n' << message.text;
+    EXPECT_THAT(flawsOf(message.text, appName, GetParam()), IsEmpty()) << message.title << '\n' << message.text;
   }
 }
 
@@ -111,6 +111,7 @@ TEST_P(ConsentMessages, HideNoDifferenceBetweenRequests) {
 TEST_P(ConsentMessages, QuoteWhatOnlyFacebookCanDescribe) {
   for (const Message& message : messagesOfEveryShape()) {
     EXPECT_EQ(message.text.find(serverDescription) != std::string::npos, message.isDescribedByServer) << message.text;
+    EXPECT_EQ(isQuotedIn(message.text, serverDescription, GetParam()), message.isDescribedByServer) << message.text;
   }
 }
 
@@ -138,36 +139,53 @@ INSTANTIATE_TEST_SUITE_P(In, EnglishConsentMessages, testing::Values("en"),
                          [](const auto& language) { return language.param; });
 
 TEST(TheSentenceCheck, AcceptsAGoodSentence) {
-  EXPECT_THAT(flawsOf("“Photo Wall” would like to see your photos on Facebook.", appName), IsEmpty());
-  EXPECT_THAT(flawsOf("May “Photo Wall” see your photos?", appName), IsEmpty());
+  const struct {
+    const char* language;
+    const char* message;
+  } sentences[] = {
+      {"en", "“Photo Wall” would like to see your photos on Facebook."},
+      {"en", "May “Photo Wall” see your photos?"},
+      {"de", "„Photo Wall“ möchte Ihre Fotos auf Facebook sehen."},
+      {"fr", "«\u00A0Photo Wall\u00A0» souhaite voir vos photos sur Facebook."},
+      {"ja", "「Photo Wall」がFacebookの写真、動画を見ることを求めています。"},
+      {"he", "היישום ”\u2068Photo Wall\u2069” מבקש לראות את התמונות שלך."},
+      {"ar", "هل تسمح لـ «\u2068Photo Wall\u2069» برؤية صورك؟"},
+  };
+  for (const auto& [language, message] : sentences) EXPECT_THAT(flawsOf(message, appName, language), IsEmpty()) << message;
 }
 
 TEST(TheSentenceCheck, FindsWhatReadsBadly) {
   const struct {
+    const char* language;
     const char* message;
     const char* flaw;
   } cases[] = {
-      {"“Photo Wall” would like to %@.", "a placeholder that nothing was put into"},
-      {"“Photo Wall” would  like to post.", "two blanks in a row"},
-      {"“Photo Wall” would like to see your photos .", "a blank before a full stop"},
-      {"“Photo Wall” would like to see your photos , videos and likes.", "a blank before a comma"},
-      {"“Photo Wall ” would like to post.", "a blank before a closing quotation mark"},
-      {"“ Photo Wall” would like to post.", "a blank after an opening quotation mark"},
-      {"“Photo Wall” would like to see your photos,, videos and likes.", "two commas in a row"},
-      {"“Photo Wall” would like to post..", "two full stops in a row"},
-      {"“Photo Wall” would like to post,.", "a comma before a full stop"},
-      {"“Photo Wall” would like to see your photos and and videos.", "a word twice in a row"},
-      {"“Photo Wall” would like to to post.", "a word twice in a row"},
-      {"“Photo Wall” would like to see your your photos.", "a word twice in a row"},
-      {"\"Photo Wall would like to post.", "a straight quotation mark"},
-      {"“Photo Wall” would like to see your friends' photos.", "a straight apostrophe"},
-      {"“Photo Wall” would like\nto post.", "a line break"},
-      {" “Photo Wall” would like to post.", "a blank at the edge"},
-      {"“Photo Wall” would like to post", "no full stop or question mark at the end"},
-      {"It would like to post.", "the application's name 0 times"},
-      {"“Photo Wall” would like Photo Wall to post.", "the application's name 2 times"},
+      {"en", "“Photo Wall” would like to %@.", "a placeholder that nothing was put into"},
+      {"en", "“Photo Wall” would  like to post.", "two blanks in a row"},
+      {"en", "“Photo Wall” would like to see your photos .", "a blank before a full stop"},
+      {"en", "“Photo Wall” would like to see your photos , videos and likes.", "a blank before a comma"},
+      {"en", "“Photo Wall” would like to see photos,, videos and likes.", "two commas in a row"},
+      {"en", "“Photo Wall” would like to see photos,.", "a comma before a full stop"},
+      {"en", "“Photo Wall” would like to see photos..", "two full stops in a row"},
+      {"en", "“Photo Wall” would like to to post.", "a word twice in a row"},
+      {"en", "“Photo Wall” would like to see your friend's photos.", "a straight apostrophe"},
+      {"en", "“Photo Wall” would like to see “likes ”.", "a blank before a closing quotation mark"},
+      {"fr", "«\u00A0Photo Wall\u00A0» souhaite voir vos «\u00A0J’aime ».", "a breaking blank before a closing quotation mark"},
+      {"fr", "«\u00A0Photo Wall\u00A0» souhaite ceci : voir vos photos.", "a breaking blank before a colon"},
+      {"ja", "「Photo Wall」が写真、、動画を見ることを求めています。", "two commas in a row"},
+      {"ar", "يريد «Photo Wall» رؤية صورك ، وفيديوهاتك.", "a blank before a comma"},
+      {"he", "”\u2068Photo Wall” מבקש לראות את התמונות שלך.", "a run of another direction that does not end"},
+      {"en", " “Photo Wall” would like to post.", "a blank at the edge"},
+      {"en", "“Photo Wall” would like to post", "no full stop or question mark at the end"},
+      {"en", "It would like to post.", "the application's name 0 times"},
+      {"en", "“Photo Wall” would like Photo Wall to post.", "the application's name 2 times"},
+      {"en", "Photo Wall would like to post.", "the application's name without the language's quotation marks"},
+      {"de", "“Photo Wall” möchte etwas posten.", "the application's name without the language's quotation marks"},
+      {"fr", "«Photo Wall» souhaite publier.", "the application's name without the language's quotation marks"},
   };
-  for (const auto& [message, flaw] : cases) EXPECT_THAT(flawsOf(message, appName), ElementsAre(flaw)) << message;
+  for (const auto& [language, message, flaw] : cases) {
+    EXPECT_THAT(flawsOf(message, appName, language), ElementsAre(flaw)) << message;
+  }
 }
 
 }  // namespace
