@@ -1,5 +1,6 @@
 // A plug-in that does what the app ID of a request says, so that every way an operation can end is seen by the scenario runner.
 
+#include <atomic>
 #include <cstdio>
 #include <cstdlib>
 #include <future>
@@ -20,8 +21,8 @@
 namespace palisade {
 namespace {
 
-int requestsInThisProcess = 0;
-int objectsInThisProcess = 0;
+std::atomic<int> requestsInThisProcess = 0;
+std::atomic<int> objectsInThisProcess = 0;
 
 [[noreturn]] void waitForEver() {
   std::promise<void>().get_future().wait();
