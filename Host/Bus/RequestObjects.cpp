@@ -87,13 +87,15 @@ BusRequest::BusRequest(RequestObjects& objects, std::string caller, const std::o
     : _objects(objects),
       _caller(std::move(caller)),
       _identifier(++objects._lastIdentifier),
-      _path(objects.reserve(_caller, token ? *token : randomToken())),
+      _path(token ? objects.reserve(_caller, *token) : nullptr),
       _result(std::move(result)) {}
 
 BusRequest::~BusRequest() = default;
 
 void BusRequest::becomePending() {
   if (_object != nullptr) return;
+  // Most requests never wait; only one that does needs a path, and pays for one that nobody can guess.
+  if (_path == nullptr) _path = _objects.reserve(_caller, randomToken());
   _object = sdbus::createObject(_objects._connection, *_path);
   _object->registerMethod("Close")
       .onInterface(requestInterface)

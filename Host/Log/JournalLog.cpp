@@ -50,7 +50,7 @@ void JournalLog::write(const LogRecord& record) {
 
 void JournalLog::logAccessRequest(const AccessRequestRecord& request) {
   if (_audit) _audit(request);
-  record("logAccessRequest", LogLevel::notice, "Access to %@ for %@ was %@ (%@).",
+  record("logAccessRequest", request.userPrompted ? LogLevel::notice : LogLevel::debug, "Access to %@ for %@ was %@ (%@).",
          "accountTypeIdentifier, bundleID, granted, userPrompted", request.accountTypeIdentifier, request.bundleID,
          std::string_view(request.granted ? "granted" : "refused"),
          std::string_view(request.userPrompted ? "the user was asked" : "nobody was asked"));

@@ -3,7 +3,8 @@
 /// The daemon's log: systemd's journal, or one readable line on stderr where there is no journal.
 ///
 /// Records carry their source file, line, operation and level as the journal's own fields (systemd.journal-fields(7)). Secrets
-/// are taken out before anything is rendered. Access-request records are handed to an audit sink and logged as notices.
+/// are taken out before anything is rendered. Access-request records are handed to an audit sink; those that
+/// a person was asked about are logged as notices too, the others only for debugging.
 /// Threads: safe from every thread; the sink is called on the thread that logs. Ownership: owns nothing but its level. Errors:
 /// a record that cannot be written is lost; a sink that fails is told on stderr.
 
