@@ -10,6 +10,7 @@
 #include <filesystem>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "Benchmarks/Daemon/AccountsCalls.h"
@@ -92,7 +93,8 @@ void addPeer(std::vector<Measured>& all, sd_bus& bus, const char* name, const ch
   }
 }
 
-void measureCalls(const MeasuredDaemon& daemon) {
+void measureCalls() {
+  const MeasuredDaemon daemon(daemonProgram);
   const Bus bus = openBus();
   std::vector<Measured> all = {
       {.name = "echo", .call = callEcho, .server = processOwning(*bus, "com.veltran.Echo1"), .goal = 0, .processorGoal = 0},
@@ -109,7 +111,9 @@ void measureCalls(const MeasuredDaemon& daemon) {
   for (const int clients : {1, 4, 16}) measureSideBySide(all, clients);
 }
 
-void measureMemory(const MeasuredDaemon& daemon) {
+void measureMemory() {
+  const MeasuredDaemon daemon(daemonProgram);
+  requestGrantedAccess(*openBus());
   const double atRest = proportionalMegabytes(daemon.process());
   double calls = 0;
   while (calls < 100'000) {
@@ -194,33 +198,46 @@ void measureApproval() {
   std::fflush(stdout);
 }
 
-void measureAll() {
+struct Part {
+  std::string_view name;
+  void (*measure)();
+};
+
+constexpr Part parts[] = {
+    {"start", measureStart},       {"calls", measureCalls},       {"memory", measureMemory},
+    {"approval", measureApproval}, {"grants", measureManyGrants},
+};
+
+void obtainGrant() {
   const Bus bus = openBus();
   requestAccessAndWait(*bus);
   stopDaemon(processOwning(*bus, "com.veltran.Accounts1"));
-  measureStart();
-  {
-    const MeasuredDaemon daemon(daemonProgram);
-    requestGrantedAccess(*bus);
-    measureCalls(daemon);
+}
+
+// Measures the parts that are named, or all. What cannot be measured is said, and the others go on.
+bool measure(const std::vector<std::string_view>& names) {
+  bool isComplete = true;
+  for (const Part& part : parts) {
+    if (!names.empty() && std::ranges::find(names, part.name) == names.end()) continue;
+    try {
+      part.measure();
+    } catch (const std::exception& error) {
+      std::printf("\nNot measured: %s: %s\n", std::string(part.name).c_str(), error.what());
+      isComplete = false;
+    }
   }
-  {
-    const MeasuredDaemon daemon(daemonProgram);
-    requestGrantedAccess(*bus);
-    measureMemory(daemon);
-  }
-  measureApproval();
-  measureManyGrants();
+  return isComplete;
 }
 
 }  // namespace
 }  // namespace palisade
 
-int main() {
+int main(int argumentCount, char** arguments) {
   try {
-    palisade::measureAll();
+    palisade::obtainGrant();
+    return palisade::measure({arguments + 1, arguments + argumentCount}) ? 0 : 1;
   } catch (const std::exception& error) {
-    std::fprintf(stderr, "The daemon's measurements ended early: %s\n", error.what());
+    std::fprintf(stderr, "The daemon cannot be measured: %s\n", error.what());
     return 1;
   }
 }
