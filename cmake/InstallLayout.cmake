@@ -22,6 +22,22 @@ function(palisade_install_service file destination)
   ")
 endfunction()
 
+# palisade_install_settings(FILE): installs everybody's settings where they are looked for, unless somebody has written some.
+function(palisade_install_settings file)
+  install(CODE "
+    set(folder \"${CMAKE_INSTALL_SYSCONFDIR}\")
+    if(CMAKE_INSTALL_PREFIX STREQUAL \"/usr\")
+      set(folder \"/etc\")
+    endif()
+    cmake_path(ABSOLUTE_PATH folder BASE_DIRECTORY \"\${CMAKE_INSTALL_PREFIX}\" NORMALIZE)
+    if(EXISTS \"\$ENV{DESTDIR}\${folder}/xdg/palisade/${file}\")
+      message(STATUS \"Kept: \$ENV{DESTDIR}\${folder}/xdg/palisade/${file}\")
+    else()
+      file(INSTALL DESTINATION \"\${folder}/xdg/palisade\" TYPE FILE FILES \"${CMAKE_CURRENT_SOURCE_DIR}/${file}\")
+    endif()
+  ")
+endfunction()
+
 # palisade_install_library(NAME AS): a library with the headers of the current folder, to be found as Palisade::AS. Everybody
 # includes the headers by their path from the top, such as "Platform/Value.h".
 function(palisade_install_library name as)

@@ -44,7 +44,7 @@ std::filesystem::path configurationFile(const std::string& name) {
   const std::filesystem::path own = configurationFolder() / name;
   std::error_code error;
   if (std::filesystem::exists(own, error)) return own;
-  for (const auto& folder : searchedFolders("XDG_CONFIG_DIRS", "/etc/xdg")) {
+  for (const auto& folder : searchedFolders("XDG_CONFIG_DIRS", "/usr/local/etc/xdg:/etc/xdg")) {
     if (std::filesystem::exists(folder / name, error)) return folder / name;
   }
   return own;

@@ -1,8 +1,10 @@
 #!/usr/bin/env python3
 """The manual pages: each command and option of a help text is in its page, and the pages are sound."""
 
+import os
 import pathlib
 import re
+import shlex
 import shutil
 import subprocess
 import sys
@@ -10,6 +12,7 @@ import unittest
 
 from command_help import commands, options_in
 
+PROJECT = pathlib.Path(__file__).resolve().parents[2]
 BUILD = pathlib.Path(sys.argv.pop(1)).resolve()
 MANUAL = BUILD / "Docs/man"
 # scdoc opens each paragraph in this way, and every formatter reads over it.
@@ -52,6 +55,18 @@ class AManualPage(unittest.TestCase):
         found = subprocess.run(["mandoc", "-T", "lint", "-W", "warning", *pages], stdout=subprocess.PIPE, encoding="utf-8",
                                check=False).stdout
         self.assertEqual([line for line in found.splitlines() if HABIT_OF_SCDOC not in line], [])
+
+    def test_shows_commands_that_are_understood(self):
+        shown = re.findall(r"(?m)^ +(palisade [^|&<\n]*[^|&<\s])", (PROJECT / "README.md").read_text(encoding="utf-8"))
+        shown += re.findall(r"(?m)^\t(palisade [^|&<\n]*[^|&<\s])", (PROJECT / "Docs/man/palisade.1.scd").read_text(encoding="utf-8"))
+        shown += re.findall(r"(?m)^  (palisade [^|&<\n]*[^|&<\s])", help_of("palisade"))
+        self.assertGreater(len(shown), 8)
+        for line in shown:
+            with self.subTest(line):
+                words = shlex.split(line)[1:]
+                done = subprocess.run([BUILD / "bin/palisade", *words], stdin=subprocess.DEVNULL, capture_output=True, encoding="utf-8",
+                                      env=dict(os.environ, DBUS_SESSION_BUS_ADDRESS="unix:path=/nonexistent"), check=False)
+                self.assertIn("There is no session bus.", done.stdout + done.stderr)
 
     def test_refers_to_pages_that_are_there(self):
         for path in MANUAL.glob("*.[158]"):

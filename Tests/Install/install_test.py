@@ -97,6 +97,21 @@ class WhatIsInstalled(unittest.TestCase):
     def test_is_complete(self):
         self.assertEqual(missing(self.prefix, RUNTIME + DEVELOPMENT), [])
 
+    def test_keeps_the_settings_that_somebody_has_written(self):
+        written = self.prefix / "etc/xdg/palisade/server.toml"
+        original = written.read_text(encoding="utf-8")
+        written.write_text("# ours\n", encoding="utf-8")
+        install(self.prefix, "--component", "runtime")
+        self.assertEqual(written.read_text(encoding="utf-8"), "# ours\n")
+        written.write_text(original, encoding="utf-8")
+
+    def test_puts_settings_where_they_are_looked_for_below_usr(self):
+        staged = self.folder / "staged"
+        run(CMAKE, "--install", BUILD, "--prefix", "/usr", "--component", "runtime", env=dict(os.environ, DESTDIR=str(staged)))
+        self.assertEqual(missing(staged, ["etc/xdg/palisade/accountd.toml", "usr/libexec/accountd"]), [])
+        service = staged / "usr/share/dbus-1/services/com.veltran.Accounts1.service"
+        self.assertIn("Exec=/usr/libexec/accountd\n", service.read_text(encoding="utf-8"))
+
     def test_comes_in_two_components(self):
         for component, own, other in [("runtime", RUNTIME, DEVELOPMENT), ("development", DEVELOPMENT, RUNTIME)]:
             with self.subTest(component):
