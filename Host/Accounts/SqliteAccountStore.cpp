@@ -21,12 +21,24 @@ const std::optional<std::filesystem::path>& SqliteAccountStore::damagedStore() c
 }
 
 std::vector<std::shared_ptr<Account>> SqliteAccountStore::accountsWithAccountTypeIdentifier(std::string_view identifier) {
-  return _connections->read([&](const AccountStoreReader& reader) {
-    std::vector<std::shared_ptr<Account>> accounts;
-    Statement::Run row = reader.accountsOfType.run(identifier);
-    while (row.next()) accounts.push_back(std::make_shared<StoredAccount>(row.text(0), row.text(1), row.text(2)));
-    return accounts;
+  const auto records = _connections->accountsOfType.get(std::string(identifier), [&] {
+    return std::optional(_connections->read([&](const AccountStoreReader& reader) {
+      std::vector<AccountRecord> read;
+      Statement::Run row = reader.accountsOfType.run(identifier);
+      while (row.next()) {
+        read.push_back({.id = row.text(0),
+                        .accountTypeIdentifier = std::string(identifier),
+                        .username = row.text(1),
+                        .description = row.text(2)});
+      }
+      return read;
+    }));
   });
+  std::vector<std::shared_ptr<Account>> accounts;
+  for (const AccountRecord& record : *records) {
+    accounts.push_back(std::make_shared<StoredAccount>(record.id, record.username, record.description));
+  }
+  return accounts;
 }
 
 std::vector<AccountRecord> SqliteAccountStore::accounts() {

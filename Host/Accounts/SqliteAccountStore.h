@@ -155,6 +155,8 @@ class SqliteAccountStore final : public AccountStore, public AuthorizationManage
  private:
   struct Store;
 
+  std::optional<std::shared_ptr<const ClientAuthorization>> _read(const std::shared_ptr<const Client>& client,
+                                                                  const std::string& clientID, const AccountType& accountType);
   template <typename Work>
   std::optional<Error> _change(const StoreChange& change, Work work);
   template <typename Work>

@@ -53,12 +53,25 @@ std::shared_ptr<ClientAuthorization> SqliteAccountStore::authorizationForClient(
                                                                                 const AccountType& accountType) {
   if (client == nullptr) return nullptr;
   const std::string clientID = _clients.idOfClient(*client);
+  const auto kept = _connections->authorizations.get(keyOf(accountType.identifier(), clientID),
+                                                     [&] { return _read(client, clientID, accountType); });
+  if (!kept) return nullptr;
+  auto record = std::make_shared<ClientAuthorization>(client);
+  record->setIsGranted((*kept)->isGranted());
+  record->setOptions((*kept)->options());
+  record->setGrantedPermissions((*kept)->grantedPermissions());
+  return record;
+}
+
+std::optional<std::shared_ptr<const ClientAuthorization>> SqliteAccountStore::_read(const std::shared_ptr<const Client>& client,
+                                                                                    const std::string& clientID,
+                                                                                    const AccountType& accountType) {
   const std::optional<ReadRow> found = _connections->read([&](const AccountStoreReader& reader) -> std::optional<ReadRow> {
     Statement::Run run = reader.authorization.run(accountType.identifier(), clientID);
     if (!run.next()) return std::nullopt;
     return readRow(run, accountType.identifier());
   });
-  if (!found) return nullptr;
+  if (!found) return std::nullopt;
 
   // The ID is compared too: damage to the index leads to the record of somebody else, which is whole.
   auto record = found->isDamaged || found->row.clientID != clientID ? nullptr : recordInRow(found->row, client);

@@ -2,6 +2,7 @@
 
 /// The account store's queries, each prepared once for its connection. Only the files of `SqliteAccountStore` include this.
 
+#include "Host/Accounts/ReadCache.h"
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Sqlite/Connections.h"
 #include "Host/Sqlite/Statement.h"
@@ -87,7 +88,27 @@ struct AccountStoreReader {
 
 struct SqliteAccountStore::Store : Connections<AccountStoreWriter, AccountStoreReader> {
   using Connections::Connections;
+
+  // A write that fails may have been stored all the same.
+  template <typename Work>
+  auto write(Work work) {
+    struct ForgetAtEnd {
+      Store& store;
+      ~ForgetAtEnd() {
+        store.accountsOfType.forget();
+        store.authorizations.forget();
+      }
+    } const forgetAtEnd{*this};
+    return Connections::write(work);
+  }
+
+  ReadCache<std::vector<AccountRecord>> accountsOfType;
+  ReadCache<std::shared_ptr<const ClientAuthorization>> authorizations;  // by keyOf(type, client); their clients do not count
 };
+
+inline std::string keyOf(std::string_view accountTypeIdentifier, std::string_view clientID) {
+  return std::to_string(accountTypeIdentifier.size()).append(":").append(accountTypeIdentifier).append(clientID);
+}
 
 /// Runs `work(database, writer)` and tells the listener when it has been stored; answers what kept it from being stored.
 template <typename Work>
