@@ -14,7 +14,7 @@ struct Choice {
 };
 
 const std::vector<Choice> thingsOfTheUser{
-    {"nothing of the user", {}},
+    {},
     {"the user's basics", {"email"}},
     {"one thing of the user", {"user_photos"}},
     {"two things of the user", {"user_photos", "user_religion_politics"}},
@@ -26,14 +26,14 @@ const std::vector<Choice> thingsOfTheUser{
 };
 
 const std::vector<Choice> thingsOfFriends{
-    {"nothing of friends", {}},
+    {},
     {"one thing of friends", {"friends_birthday"}},
     {"two things of friends", {"friends_photos", "friends_location"}},
     {"many things of friends", {"friends_about_me", "friends_likes", "friends_religion_politics", "friends_website"}},
 };
 
 const std::vector<Choice> managing{
-    {"nothing to manage", {}},
+    {},
     {"one thing to manage", {"manage_pages"}},
     {"two things to manage", {"create_event", "rsvp_event"}},
     {"many things to manage", {"ads_management", "xmpp_login", "manage_friendlists", "manage_notifications"}},
@@ -45,21 +45,61 @@ struct Posting {
 };
 
 const std::vector<Posting> posting{
-    {{"no posts", {}}, std::nullopt},
+    {},
     {{"posts for everyone", {"publish_actions"}}, std::string(FacebookAudienceEveryone)},
     {{"posts for friends", {"publish_stream"}}, std::string(FacebookAudienceFriends)},
     {{"posts for the user alone", {"publish_checkins", "publish"}}, std::string(FacebookAudienceOnlyMe)},
 };
 
 const std::vector<Choice> unknown{
-    {"nothing unknown", {}},
+    {},
     {"something that only Facebook knows", {permissionThatOnlyTheServerKnows}},
 };
 
 void add(ConsentRequest& request, const Choice& choice) {
+  if (choice.permissions.empty()) return;
   request.permissions.insert(choice.permissions.begin(), choice.permissions.end());
   if (!request.title.empty()) request.title += "; ";
   request.title += choice.title;
+}
+
+/// What a request asks for, as places in the lists above. None asks for anything at place 0.
+struct Shape {
+  std::size_t user;
+  std::size_t friends;
+  std::size_t posted;
+  std::size_t managed;
+  std::size_t described;
+};
+
+ConsentRequest requestOfShape(const Shape& shape) {
+  ConsentRequest request;
+  add(request, thingsOfTheUser[shape.user]);
+  add(request, thingsOfFriends[shape.friends]);
+  add(request, posting[shape.posted].choice);
+  add(request, managing[shape.managed]);
+  add(request, unknown[shape.described]);
+  if (request.title.empty()) request.title = "the account alone";
+  request.audience = posting[shape.posted].audience;
+  return request;
+}
+
+template <typename Predicate>
+std::vector<ConsentRequest> requestsWhere(Predicate isWanted) {
+  std::vector<ConsentRequest> requests;
+  for (std::size_t described = 0; described < unknown.size(); ++described) {
+    for (std::size_t managed = 0; managed < managing.size(); ++managed) {
+      for (std::size_t posted = 0; posted < posting.size(); ++posted) {
+        for (std::size_t friends = 0; friends < thingsOfFriends.size(); ++friends) {
+          for (std::size_t user = 0; user < thingsOfTheUser.size(); ++user) {
+            const Shape shape{user, friends, posted, managed, described};
+            if (isWanted(shape)) requests.push_back(requestOfShape(shape));
+          }
+        }
+      }
+    }
+  }
+  return requests;
 }
 
 }  // namespace
@@ -72,26 +112,19 @@ std::vector<ConsentRequest> requestsForEachOf(const PermissionSet& permissions) 
 }
 
 std::vector<ConsentRequest> requestsOfEveryShape() {
-  std::vector<ConsentRequest> requests;
-  for (const Choice& described : unknown) {
-    for (const Choice& managed : managing) {
-      for (const Posting& posted : posting) {
-        for (const Choice& friends : thingsOfFriends) {
-          for (const Choice& user : thingsOfTheUser) {
-            ConsentRequest request;
-            add(request, user);
-            add(request, friends);
-            add(request, posted.choice);
-            add(request, managed);
-            add(request, described);
-            request.audience = posted.audience;
-            requests.push_back(std::move(request));
-          }
-        }
-      }
+  return requestsWhere([](const Shape&) { return true; });
+}
+
+std::vector<ConsentRequest> requestsForReview() {
+  return requestsWhere([](const Shape& shape) {
+    const bool readsNothing = shape.user == 0 && shape.friends == 0;
+    const bool readsTwoThings = shape.user == 3;
+    if (shape.described > 0) {
+      return (readsNothing || (readsTwoThings && shape.friends == 0)) && shape.posted <= 1 && shape.managed <= 1;
     }
-  }
-  return requests;
+    if (shape.posted == 0 && shape.managed == 0) return true;
+    return readsNothing || (readsTwoThings && (shape.friends == 0 || shape.friends == 3));
+  });
 }
 
 }  // namespace palisade

@@ -27,4 +27,7 @@ std::vector<ConsentRequest> requestsForEachOf(const PermissionSet& permissions);
 /// Every combination of reading, posting, managing and unknown permissions. All give different messages.
 std::vector<ConsentRequest> requestsOfEveryShape();
 
+/// Those of them that a person has to look at to have seen each kind of sentence with each kind of phrase.
+std::vector<ConsentRequest> requestsForReview();
+
 }  // namespace palisade

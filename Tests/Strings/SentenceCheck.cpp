@@ -121,7 +121,7 @@ bool isQuotedIn(std::string_view message, std::string_view text, std::string_vie
   });
 }
 
-std::vector<std::string> flawsOf(std::string_view message, std::string_view appName, std::string_view language) {
+std::vector<std::string> flawsOf(std::string_view message, std::string_view applicationName, std::string_view language) {
   const std::string plain = withoutDirectionMarks(message);
   std::vector<std::string> flaws;
   for (const auto& [part, flaw] : unwantedParts) {
@@ -136,9 +136,9 @@ std::vector<std::string> flawsOf(std::string_view message, std::string_view appN
       occurrences(message, "\u2069")) {
     flaws.emplace_back("a run of another direction that does not end");
   }
-  if (const std::size_t count = occurrences(message, appName); count != 1) {
+  if (const std::size_t count = occurrences(message, applicationName); count != 1) {
     flaws.push_back("the application's name " + std::to_string(count) + " times");
-  } else if (!isQuotedIn(message, appName, language)) {
+  } else if (!isQuotedIn(message, applicationName, language)) {
     flaws.emplace_back("the application's name without the language's quotation marks");
   }
   return flaws;

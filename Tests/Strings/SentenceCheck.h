@@ -14,6 +14,6 @@ namespace palisade {
 bool isQuotedIn(std::string_view message, std::string_view text, std::string_view language);
 
 /// What is wrong with the message; empty when nothing is.
-std::vector<std::string> flawsOf(std::string_view message, std::string_view appName, std::string_view language);
+std::vector<std::string> flawsOf(std::string_view message, std::string_view applicationName, std::string_view language);
 
 }  // namespace palisade

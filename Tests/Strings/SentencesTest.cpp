@@ -1,4 +1,4 @@
-// Looks at every consent message in every language, and writes them to a file for people to look at.
+// Looks at every consent message in every language, and writes them to files for people to look at.
 
 #include <gmock/gmock.h>
 
@@ -7,11 +7,8 @@
 #include <map>
 #include <sstream>
 
-#include "Facebook/Palisade/VXFacebookAccountAccessPlugin.h"
-#include "Host/Json/Json.h"
-#include "Host/Strings/GettextStringTable.h"
-#include "Testing/FakePlatform.h"
-#include "Tests/Strings/ConsentRequests.h"
+#include "Tests/Strings/ConsentMessages.h"
+#include "Tests/Strings/ReviewPage.h"
 #include "Tests/Strings/SentenceCheck.h"
 
 namespace palisade {
@@ -22,101 +19,56 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::StartsWith;
 
-constexpr const char* appName = "Photo Wall";
-constexpr const char* serverDescription = "Play games with your friends";
-
-class PluginThatSpeaks : public VXFacebookAccountAccessPlugin {
- public:
-  using VXFacebookAccountAccessPlugin::_constructUserMessageForPermissions;
-  using VXFacebookAccountAccessPlugin::_extendedReadPermissions;
-  using VXFacebookAccountAccessPlugin::_managePermissions;
-  using VXFacebookAccountAccessPlugin::VXFacebookAccountAccessPlugin;
-};
-
-struct Message {
-  std::string title;
-  std::string text;
-  bool isDescribedByServer = false;
-};
-
 /// The messages in the language that is the test's parameter.
-class ConsentMessages : public testing::TestWithParam<std::string> {
+class ConsentMessagesIn : public testing::TestWithParam<std::string> {
  protected:
-  ConsentMessages() {
-    _platform.log.enableUpTo(LogLevel::error);
-    _platform.store->addAccount({.id = "1", .type = "facebook", .description = "me"});
-    _platform.social.descriptionAnswers = {{.data = '"' + std::string(serverDescription) + '"', .delivery = Delivery::inLine}};
-  }
-
-  /// Of the permissions that have a name of their own, each alone.
-  std::vector<Message> messagesForOnePermission() {
-    std::vector<Message> messages = messagesFor(requestsForEachOf(_plugin->_extendedReadPermissions()));
-    for (Message& message : messagesFor(requestsForEachOf(_plugin->_managePermissions())))
-      messages.push_back(std::move(message));
-    return messages;
-  }
-
-  std::vector<Message> messagesOfEveryShape() { return messagesFor(requestsOfEveryShape()); }
-
-  std::vector<Message> allMessages() {
-    std::vector<Message> messages = messagesForOnePermission();
-    for (Message& message : messagesOfEveryShape()) messages.push_back(std::move(message));
-    return messages;
-  }
-
- private:
-  // A message that the plug-in does not make is empty.
-  std::vector<Message> messagesFor(const std::vector<ConsentRequest>& requests) {
-    const auto account = _platform.store->accountsWithAccountTypeIdentifier("facebook").front();
-    std::vector<Message> messages;
-    for (const ConsentRequest& request : requests) {
-      const auto text = _plugin->_constructUserMessageForPermissions(request.permissions, request.audience, appName, account);
-      messages.push_back({.title = request.title,
-                          .text = text.value_or(""),
-                          .isDescribedByServer = request.permissions.contains(permissionThatOnlyTheServerKnows)});
-    }
-    return messages;
-  }
-
-  FakePlatform& _platform = FakePlatform::create(std::make_shared<NlohmannJsonParser>(),
-                                                 std::make_shared<GettextStringTable>(PALISADE_RESOURCES, GetParam()));
-  std::shared_ptr<const PluginThatSpeaks> _plugin = std::make_shared<const PluginThatSpeaks>(_platform.services());
+  const ConsentMessages messages{PALISADE_RESOURCES, GetParam()};
 };
 
-TEST_P(ConsentMessages, AreWrittenToAFileForPeopleToRead) {
-  const std::filesystem::path file = std::filesystem::path(PALISADE_SENTENCES) / (GetParam() + ".txt");
-  std::filesystem::create_directories(file.parent_path());
-  std::ofstream stream(file);
-  for (const Message& message : allMessages()) stream << "# " << message.title << '\n' << message.text << "\n\n";
-  stream.close();
-  ASSERT_TRUE(stream) << "Cannot write " << file;
+TEST_P(ConsentMessagesIn, AreWrittenToFilesForPeopleToRead) {
+  const std::filesystem::path folder = PALISADE_SENTENCES;
+  std::filesystem::create_directories(folder);
+  std::ofstream list(folder / (GetParam() + ".txt"));
+  for (const ConsentMessage& message : messages.all()) list << "# " << message.title << '\n' << message.text << "\n\n";
+  std::ofstream page(folder / (GetParam() + ".md"));
+  page << reviewPage(GetParam(), messages);
+  list.close();
+  page.close();
+  ASSERT_TRUE(list && page) << "Cannot write to " << folder;
 }
 
-TEST_P(ConsentMessages, ReadLikeSentences) {
-  for (const Message& message : allMessages()) {
+TEST_P(ConsentMessagesIn, AreShownToReviewersAsTheyAre) {
+  const std::filesystem::path file = std::filesystem::path(PALISADE_REVIEW_PAGES) / (GetParam() + ".md");
+  std::ifstream stream(file);
+  const std::string page{std::istreambuf_iterator<char>(stream), {}};
+  EXPECT_TRUE(page == reviewPage(GetParam(), messages)) << file << " is out of date. Build the target sentence-pages.";
+}
+
+TEST_P(ConsentMessagesIn, ReadLikeSentences) {
+  for (const ConsentMessage& message : messages.all()) {
     EXPECT_THAT(flawsOf(message.text, appName, GetParam()), IsEmpty()) << message.title << '\n' << message.text;
   }
 }
 
-TEST_P(ConsentMessages, HideNoDifferenceBetweenRequests) {
-  for (const auto& messages : {messagesForOnePermission(), messagesOfEveryShape()}) {
+TEST_P(ConsentMessagesIn, HideNoDifferenceBetweenRequests) {
+  for (const auto& group : {messages.ofOnePermission(), messages.ofEveryShape()}) {
     std::map<std::string, std::string> titles;
-    for (const Message& message : messages) {
+    for (const ConsentMessage& message : group) {
       const auto [earlier, isNew] = titles.emplace(message.text, message.title);
       EXPECT_TRUE(isNew) << message.text << "\nis said of: " << earlier->second << "\nand of: " << message.title;
     }
   }
 }
 
-TEST_P(ConsentMessages, QuoteWhatOnlyFacebookCanDescribe) {
-  for (const Message& message : messagesOfEveryShape()) {
+TEST_P(ConsentMessagesIn, QuoteWhatOnlyFacebookCanDescribe) {
+  for (const ConsentMessage& message : messages.ofEveryShape()) {
     EXPECT_EQ(message.text.find(serverDescription) != std::string::npos, message.isDescribedByServer) << message.text;
     EXPECT_EQ(isQuotedIn(message.text, serverDescription, GetParam()), message.isDescribedByServer) << message.text;
   }
 }
 
-TEST_P(ConsentMessages, NameTheAccountThatIsAskedFor) {
-  for (const Message& message : allMessages()) EXPECT_THAT(message.text, HasSubstr("Facebook"));
+TEST_P(ConsentMessagesIn, NameTheAccountThatIsAskedFor) {
+  for (const ConsentMessage& message : messages.all()) EXPECT_THAT(message.text, HasSubstr("Facebook"));
 }
 
 std::vector<std::string> languages() {
@@ -126,13 +78,13 @@ std::vector<std::string> languages() {
   return names;
 }
 
-INSTANTIATE_TEST_SUITE_P(In, ConsentMessages, testing::ValuesIn(languages()),
+INSTANTIATE_TEST_SUITE_P(The, ConsentMessagesIn, testing::ValuesIn(languages()),
                          [](const auto& language) { return language.param; });
 
-class EnglishConsentMessages : public ConsentMessages {};
+class EnglishConsentMessages : public ConsentMessagesIn {};
 
 TEST_P(EnglishConsentMessages, BeginWithTheApplicationInQuotes) {
-  for (const Message& message : allMessages()) EXPECT_THAT(message.text, StartsWith("“Photo Wall” would like to "));
+  for (const ConsentMessage& message : messages.all()) EXPECT_THAT(message.text, StartsWith("“Photo Wall” would like to "));
 }
 
 INSTANTIATE_TEST_SUITE_P(In, EnglishConsentMessages, testing::Values("en"),
