@@ -42,6 +42,9 @@ CallFailed failureOf(const sdbus::Error& error) {
   if (name == "ServiceUnknown" || name == "NameHasNoOwner") {
     return {name, "The account daemon does not run and could not be started. `palisade doctor` says what is missing."};
   }
+  if (error.getName().find(".Spawn.") != std::string::npos || error.getName().find("systemd1") != std::string::npos) {
+    return {name, "The account daemon ended when it was started. `journalctl --user -u accountd` says why."};
+  }
   if (name == "NoReply" || name == "Timeout" || name == "TimedOut")
     return {name, "The account daemon did not answer in time. `palisade doctor` says what it waits for."};
   return {name, (error.getMessage().empty() ? error.getName() : error.getMessage()) + std::string(nextStepAfter(name))};

@@ -11,6 +11,7 @@ import tempfile
 import time
 import unittest
 
+PROJECT = pathlib.Path(__file__).resolve().parents[2]
 BUILD = pathlib.Path(sys.argv.pop(1)).resolve()
 CMAKE = sys.argv.pop(1)
 
@@ -52,6 +53,7 @@ class Session:
             (self.root / folder).mkdir(mode=0o700)
         configuration = self.root / "bus.conf"
         configuration.write_text(BUS_CONFIGURATION.format(root=self.root), encoding="utf-8")
+        self._helpers: "list[subprocess.Popen]" = []
         self._log = open(self.root / "bus.log", "ab")
         self._bus = subprocess.Popen(["dbus-daemon", "--nofork", "--print-address", f"--config-file={configuration}"],
                                      env=self.environment, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=self._log)
@@ -61,6 +63,10 @@ class Session:
         return self
 
     def __exit__(self, *_):
+        for helper in self._helpers:
+            helper.terminate()
+            helper.wait()
+            helper.stdout.close()
         # The daemons end with their bus.
         daemons = [self.process_of(name) for name in ("com.veltran.Accounts1", "com.veltran.Vantad1")]
         self._bus.terminate()
@@ -75,9 +81,29 @@ class Session:
         return subprocess.run(command, input=text, capture_output=True, encoding="utf-8", timeout=60, check=False,
                               env=self.environment)
 
+    def start(self, *command) -> str:
+        """Starts a program that says in its first line when it is ready, and answers the line."""
+        self._helpers.append(subprocess.Popen(command, env=self.environment, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+                                              stderr=self._log, encoding="utf-8"))
+        return self._helpers[-1].stdout.readline().strip()
+
+    def write(self, name: str, content: str) -> None:
+        """Writes a file below the home."""
+        path = self.root / "home" / name
+        path.parent.mkdir(parents=True, exist_ok=True)
+        path.write_text(content, encoding="utf-8")
+
     def call_bus(self, method: str, *arguments: str) -> str:
         return self.run("gdbus", "call", "--session", "--dest", "org.freedesktop.DBus", "--object-path", "/org/freedesktop/DBus",
                         "--method", f"org.freedesktop.DBus.{method}", *arguments).stdout
+
+    def leave_revocation(self) -> None:
+        """Writes down that a token is to be made invalid, as if the account daemon had done so and ended."""
+        database = sqlite3.connect(self.root / "home/.local/state/palisade/outbox.sqlite")
+        with database:
+            database.execute("INSERT INTO invalidations (account_id, app_id, requested_at, requested_boot, requested_uptime)"
+                             " VALUES ('1', '42', 1700000000, '', 0)")
+        database.close()
 
     def process_of(self, name: str) -> "int | None":
         """Who owns a name on the bus; asking starts nobody."""
@@ -124,6 +150,22 @@ class TheInstalledDaemons(unittest.TestCase):
             self.assertRegex(doctor, r"(?m)^fail  server +https://127.0.0.1:1")
             self.assertIsNone(session.process_of("com.veltran.Vantad1"), "there is nothing to do for it")
 
+    def test_make_a_token_invalid_that_is_revoked(self):
+        with Session(self.prefix) as session:
+            terminal = session.start(sys.executable, PROJECT / "Tools/Trial/answer_alerts.py", "--answer", "allow")
+            session.write(".config/palisade/accountd.toml", f'keychain = "vault"\nterminal = "{terminal}"\n')
+            session.write(".local/share/palisade/clients/org.example.photos.toml", 'bundle_id = "org.example.photos"\nname = "Photos"\n'
+                          f'[match]\nexecutable = "{self.prefix}/bin/palisade"\n')
+            session.start(BUILD / "bin/palisade-sandbox", "--configuration", session.root / "home/.config/palisade/server.toml")
+            token = (session.root / "runtime/palisade-sandbox/master-token").read_text(encoding="utf-8")
+
+            self.assertEqual(session.run("palisade", "account", "add", "ada", text=token).returncode, 0)
+            self.assertEqual(session.run("palisade", "request", "--app", "1", "--permission", "email").stdout, "Access is granted.\n")
+            self.assertIsNone(session.process_of("com.veltran.Vantad1"), "there is nothing to do for it yet")
+            self.assertEqual(session.run("palisade", "revoke", "org.example.photos").returncode, 0)
+            wait_until(lambda: "confirmed" in session.run("palisade", "revocations").stdout, "the server has confirmed it")
+            self.assertEqual(session.program_of("com.veltran.Vantad1"), f"{self.prefix}/libexec/vantad")
+
     def test_start_the_social_daemon_when_a_token_is_left_to_be_taken_back(self):
         with Session(self.prefix) as session:
             session.call_bus("StartServiceByName", "com.veltran.Vantad1", "0")
@@ -133,14 +175,24 @@ class TheInstalledDaemons(unittest.TestCase):
             wait_until(lambda: session.process_of("com.veltran.Vantad1") is None, "vantad has ended")
 
             # What an earlier session left behind: the account daemon looks when it starts.
-            outbox = session.root / "home/.local/state/palisade/outbox.sqlite"
-            database = sqlite3.connect(outbox)
-            with database:
-                database.execute("INSERT INTO invalidations (account_id, app_id, requested_at, requested_boot, requested_uptime)"
-                                 " VALUES ('1', '42', 1700000000, '', 0)")
-            database.close()
+            session.leave_revocation()
             session.run("palisade", "grants")
             wait_until(lambda: session.program_of("com.veltran.Vantad1") == f"{self.prefix}/libexec/vantad", "vantad is started")
+
+            os.kill(session.process_of("com.veltran.Vantad1"), 9)
+            wait_until(lambda: session.process_of("com.veltran.Vantad1") is None, "vantad is gone")
+            session.leave_revocation()
+            self.assertRegex(session.run("palisade", "doctor").stdout,
+                             r"(?m)^fail  vantad .*\n +1 revocation waits at the server, and vantad does not run. Start it")
+
+    def test_that_cannot_start_leave_the_caller_with_where_to_look(self):
+        with Session(self.prefix) as session:
+            session.write(".config/palisade/accountd.toml", 'keychain = "drawer"\n')
+            grants = session.run("palisade", "grants")
+            self.assertEqual(grants.returncode, 2)
+            self.assertEqual(grants.stderr, "palisade: The account daemon ended when it was started. "
+                                            "`journalctl --user -u accountd` says why.\n")
+            self.assertIn("There is no keychain 'drawer'", (session.root / "bus.log").read_text(encoding="utf-8"))
 
     def test_say_so_when_they_are_started_twice(self):
         with Session(self.prefix) as session:
