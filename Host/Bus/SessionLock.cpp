@@ -1,0 +1,97 @@
+#include "Host/Bus/SessionLock.h"
+
+#include <sdbus-c++/sdbus-c++.h>
+#include <unistd.h>
+
+#include <map>
+#include <stdexcept>
+#include <string>
+
+namespace palisade {
+namespace {
+
+constexpr const char* logins = "org.freedesktop.login1";
+constexpr const char* loginSession = "org.freedesktop.login1.Session";
+
+// What a login manager says of a session: its ID, its user's number and name, its seat, its object.
+using LoginSession = sdbus::Struct<std::string, std::uint32_t, std::string, std::string, sdbus::ObjectPath>;
+
+std::vector<LoginSession> loginSessions(sdbus::IConnection& bus) {
+  const auto manager = sdbus::createProxy(bus, logins, "/org/freedesktop/login1");
+  std::vector<LoginSession> sessions;
+  manager->callMethod("ListSessions").onInterface("org.freedesktop.login1.Manager").storeResultsTo(sessions);
+  return sessions;
+}
+
+// What a handler cannot read is no lock.
+template <typename Read>
+sdbus::message_handler whenLocked(const std::function<void()>& onLock, Read isLock) {
+  return [&onLock, isLock](sdbus::Message& message) {
+    bool isLocked = false;
+    try {
+      isLocked = isLock(message);
+    } catch (const sdbus::Error&) {
+      return;
+    }
+    if (isLocked) onLock();
+  };
+}
+
+bool becomesActive(sdbus::Message& message) {
+  bool isActive = false;
+  message >> isActive;
+  return isActive;
+}
+
+bool saysItIsLocked(sdbus::Message& message) {
+  std::string interface;
+  std::map<std::string, sdbus::Variant> changed;
+  message >> interface >> changed;
+  const auto hint = changed.find("LockedHint");
+  return interface == loginSession && hint != changed.end() && hint->second.get<bool>();
+}
+
+}  // namespace
+
+SessionLock::SessionLock(std::function<void()> onLock) : _onLock(std::move(onLock)) {
+  for (const auto listen : {&SessionLock::listenToScreenSaver, &SessionLock::listenToLogins}) {
+    try {
+      (this->*listen)();
+    } catch (const sdbus::Error&) {
+      continue;
+    }
+  }
+  if (_connections.empty()) throw std::runtime_error("Neither the session bus nor the system bus tells of locks.");
+}
+
+SessionLock::~SessionLock() {
+  for (const auto& connection : _connections) connection->leaveEventLoop();
+}
+
+// Screen savers differ in where their object is; what they say is the same.
+void SessionLock::listenToScreenSaver() {
+  auto bus = sdbus::createSessionBusConnection();
+  for (const char* interface : {"org.freedesktop.ScreenSaver", "org.gnome.ScreenSaver"}) {
+    bus->addMatch("type='signal',member='ActiveChanged',interface='" + std::string(interface) + "'",
+                  whenLocked(_onLock, becomesActive), sdbus::floating_slot);
+  }
+  bus->enterEventLoopAsync();
+  _connections.push_back(std::move(bus));
+}
+
+// `loginctl lock-session` sends Lock; a desktop that locks by itself sets LockedHint. Other users' sessions are none of ours.
+void SessionLock::listenToLogins() {
+  auto bus = sdbus::createSystemBusConnection();
+  for (const LoginSession& session : loginSessions(*bus)) {
+    if (std::get<1>(session) != getuid()) continue;
+    const std::string ofSession = "type='signal',sender='" + std::string(logins) + "',path='" + std::get<4>(session) + "',";
+    bus->addMatch(ofSession + "member='Lock',interface='" + loginSession + "'",
+                  whenLocked(_onLock, [](sdbus::Message&) { return true; }), sdbus::floating_slot);
+    bus->addMatch(ofSession + "member='PropertiesChanged',interface='org.freedesktop.DBus.Properties'",
+                  whenLocked(_onLock, saysItIsLocked), sdbus::floating_slot);
+  }
+  bus->enterEventLoopAsync();
+  _connections.push_back(std::move(bus));
+}
+
+}  // namespace palisade
