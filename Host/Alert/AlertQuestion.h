@@ -26,7 +26,7 @@ struct AlertSubject {
   /// The application's identifier, or the path of a program that has none.
   std::string applicationID;
   AlertCertainty certainty = AlertCertainty::claimed;
-  std::string account;
+  std::string account = {};
 };
 
 struct AlertQuestion {

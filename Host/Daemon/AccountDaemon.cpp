@@ -7,14 +7,16 @@
 #include "Host/Accounts/AccessHistory.h"
 #include "Host/Accounts/ClientDirectory.h"
 #include "Host/Accounts/SqliteAccountStore.h"
-#include "Host/Alert/TerminalAlert.h"
+#include "Host/Alert/SessionAlert.h"
 #include "Host/Bus/BusLoop.h"
 #include "Host/Bus/BusPresence.h"
 #include "Host/Bus/BusServer.h"
+#include "Host/Bus/SessionLock.h"
 #include "Host/Daemon/AccountOperations.h"
 #include "Host/Daemon/AlertScheduler.h"
 #include "Host/Daemon/CrashRepair.h"
 #include "Host/Daemon/HealthChecks.h"
+#include "Host/Daemon/Operation.h"
 #include "Host/Daemon/OperationKeychain.h"
 #include "Host/Daemon/Paths.h"
 #include "Host/Daemon/PluginHost.h"
@@ -26,6 +28,7 @@
 #include "Host/Preferences/TomlPreferencesStore.h"
 #include "Host/Queue/ThreadSerialQueue.h"
 #include "Host/Social/HttpSocialFramework.h"
+#include "Host/Strings/LanguagePreference.h"
 #include "Host/Vantad/Outbox.h"
 #include "Platform/AccountConstants.h"
 
@@ -51,6 +54,15 @@ ServerConfiguration serverConfiguration() {
   } catch (const ServerConfigurationError& error) {
     throw std::runtime_error(file.string() + ": " + error.what());
   }
+}
+
+// The program that shows alerts on a desktop is installed beside this one.
+std::filesystem::path alertHelper() { return std::filesystem::read_symlink("/proc/self/exe").parent_path() / "palisade-alert"; }
+
+std::string alertLanguages() {
+  std::string languages;
+  for (const std::string& language : preferredCatalogues(std::nullopt)) languages += (languages.empty() ? "" : ":") + language;
+  return languages;
 }
 
 /// Tells grants' clients apart for the store.
@@ -90,8 +102,11 @@ struct AccountDaemon::Parts {
         http(server.httpOptions()),
         social(http, outbox, FacebookServer(server), [this] { return firstFacebookAccount(); }),
         preferences(configurationFolder() / "preferences"),
-        terminal(configuration.terminal.value_or("")),
-        alert(terminal, TerminalAlert::takeDown),
+        frontEnd({.choice = configuration.alert,
+                  .terminal = configuration.terminal,
+                  .desktop = {.helper = alertHelper(), .subject = [this] { return subject(); }, .languages = alertLanguages},
+                  .watchLock = [](auto onLock) { return std::make_shared<const SessionLock>(std::move(onLock)); }}),
+        alert(frontEnd, SessionAlert::takeDown),
         service({.store = store,
                  .history = history,
                  .keychain = *keychain,
@@ -135,6 +150,24 @@ struct AccountDaemon::Parts {
     return std::nullopt;
   }
 
+  /// Who asks through the calling thread, as an alert shows it.
+  std::optional<AlertSubject> subject() {
+    const Operation* operation = Operation::current();
+    if (operation == nullptr || !operation->grant()) return std::nullopt;
+    const Intent& grant = *operation->grant();
+    AlertSubject subject{.applicationName = std::filesystem::path(grant.clientID).filename(), .applicationID = grant.clientID};
+    if (const auto client = clients.clientWithID(grant.clientID)) {
+      subject.applicationName = client->localizedAppName();
+      if (client->clientClass() == ClientClass::sandboxed) subject.certainty = AlertCertainty::certain;
+    }
+    for (const AccountRecord& account : store.accounts()) {
+      if (account.accountTypeIdentifier == grant.accountTypeIdentifier && subject.account.empty()) {
+        subject.account = account.username;
+      }
+    }
+    return subject;
+  }
+
   Rows revocations() {
     Rows rows;
     for (const Invalidation& entry : outbox.latest(listedRevocations)) {
@@ -157,7 +190,7 @@ struct AccountDaemon::Parts {
     for (const std::string& module : plugins->modules()) modules.emplace_back(module);
     Dictionary report{{"plugins", modules},
                       {"keychain", keychain->description()},
-                      {"alert", terminal.isAvailable() ? "terminal" : "nobody"},
+                      {"alert", nameOf(frontEnd.frontEnd())},
                       {"server", server.address},
                       {"store", (stateFolder() / "accounts.sqlite").string()},
                       {"log", log.destination()},
@@ -165,10 +198,7 @@ struct AccountDaemon::Parts {
     if (!plugins->troubles().empty()) report.set("plugins_trouble", plugins->troubles().front());
     if (modules.empty()) report.set("plugins_trouble", "No plug-in was loaded.");
     if (!clients.troubles().empty()) report.set("clients_trouble", clients.troubles().front());
-    if (!terminal.isAvailable()) {
-      report.set("alert_trouble",
-                 "Nobody can be asked. Start accountd with --terminal \"$(tty)\", or set terminal in accountd.toml.");
-    }
+    if (const auto trouble = frontEnd.trouble()) report.set("alert_trouble", *trouble);
     if (const auto trouble = troubleWithKeychain(*keychain)) report.set("keychain_trouble", *trouble);
     if (server.address.empty()) {
       report.set("server_trouble", "No server is configured. Write address = \"https://…\" into " +
@@ -192,7 +222,7 @@ struct AccountDaemon::Parts {
   TomlPreferencesStore preferences;
   ThreadSerialQueueFactory queues;
   NlohmannJsonParser json;
-  TerminalAlert terminal;
+  SessionAlert frontEnd;
   AlertScheduler alert;
   AccountOperations service;
   OperationKeychain pluginKeychain;

@@ -11,6 +11,7 @@ Owns a user's accounts and decides, with its plug-ins, which applications may us
 called; see com.veltran.Accounts1 there, and palisade(1) for people.
 
   --plugins DIRECTORY   load the plug-ins in this folder
+  --alert FRONT-END     desktop, terminal or nobody; otherwise whatever the session has
   --terminal TTY        ask the user on this terminal, such as the one that `tty` prints
   --keychain CHOICE     automatic, secret-service or vault
   --log LEVEL           error, notice or debug
@@ -28,6 +29,11 @@ KeychainChoice keychainChoice(std::string_view word) {
   throw std::runtime_error("There is no keychain '" + std::string(word) + "': it is automatic, secret-service or vault.");
 }
 
+AlertFrontEnd alertFrontEnd(std::string_view word) {
+  if (const auto choice = alertFrontEndNamed(word)) return *choice;
+  throw std::runtime_error("There is no alert '" + std::string(word) + "': it is desktop, terminal or nobody.");
+}
+
 LogLevel logLevel(std::string_view word) {
   if (word == "error") return LogLevel::error;
   if (word == "notice") return LogLevel::notice;
@@ -38,6 +44,8 @@ LogLevel logLevel(std::string_view word) {
 void apply(std::string_view name, const std::string& value, DaemonConfiguration& configuration) {
   if (name == "plugins") {
     configuration.plugins = value;
+  } else if (name == "alert") {
+    configuration.alert = alertFrontEnd(value);
   } else if (name == "terminal") {
     configuration.terminal = value;
   } else if (name == "keychain") {

@@ -8,6 +8,7 @@
 #include <optional>
 #include <string>
 
+#include "Host/Alert/SessionAlert.h"
 #include "Host/Keychain/OpenKeychain.h"
 #include "Platform/Log.h"
 #include "Platform/Value.h"
@@ -16,13 +17,16 @@ namespace palisade {
 
 struct DaemonConfiguration {
   std::filesystem::path plugins;
-  /// The terminal on which to ask; none asks nobody.
+  /// What asks the user; none takes what the session has.
+  std::optional<AlertFrontEnd> alert = std::nullopt;
+  /// The terminal on which to ask; none asks on none.
   std::optional<std::string> terminal = std::nullopt;
   KeychainChoice keychain = KeychainChoice::automatic;
   LogLevel logLevel = LogLevel::notice;
 };
 
-/// `table` is accountd.toml's: plugins, terminal, keychain (automatic, secret-service, vault), log (error, notice, debug).
+/// `table` is accountd.toml's: plugins, alert (desktop, terminal, nobody), terminal, keychain (automatic, secret-service,
+/// vault), log (error, notice, debug).
 void applyConfigurationFile(const Dictionary& table, DaemonConfiguration& configuration);
 
 /// What the command line asks for.

@@ -4,6 +4,8 @@
 // "foreign" consent to another question; "text WORD"; "signal N"; "exit N"; "linger" never ends; "environment" writes its
 // environment to the file that the message names.
 
+#include <sys/prctl.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -71,6 +73,9 @@ void obey(const std::string& order, std::istringstream& rest, const AlertQuestio
 }  // namespace
 
 int main() {
+  prctl(PR_SET_PDEATHSIG, SIGKILL, 0, 0, 0);
+  const rlimit noCoreFiles{.rlim_cur = 0, .rlim_max = 0};
+  setrlimit(RLIMIT_CORE, &noCoreFiles);
   const AlertQuestion question = receiveQuestion();
   std::istringstream orders(question.title);
   for (std::string order; orders >> order;) obey(order, orders, question);

@@ -5,6 +5,7 @@
 
 #include <fcntl.h>
 #include <gmock/gmock.h>
+#include <poll.h>
 #include <stdlib.h>
 #include <termios.h>
 #include <unistd.h>
@@ -95,6 +96,9 @@ TEST_F(ATerminalAlert, AllowsNothingBeforeItHasStoodLongEnough) {
 TEST_F(ATerminalAlert, ForgetsWhatWasTypedBeforeItStood) {
   const int early = open(_terminal.c_str(), O_RDWR | O_NOCTTY | O_CLOEXEC);
   type("\r");
+  // What is typed reaches the terminal a moment later.
+  pollfd typed{.fd = early, .events = POLLIN, .revents = 0};
+  ASSERT_EQ(poll(&typed, 1, -1), 1);
   EXPECT_EQ(answerAfter({"\x1b"}), nobody);
   close(early);
 }

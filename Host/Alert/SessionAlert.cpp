@@ -1,0 +1,122 @@
+#include "Host/Alert/SessionAlert.h"
+
+#include <array>
+#include <cerrno>
+#include <exception>
+#include <utility>
+
+namespace palisade {
+namespace {
+
+constexpr std::array<std::pair<AlertFrontEnd, std::string_view>, 3> frontEndNames = {
+    {{AlertFrontEnd::desktop, "desktop"}, {AlertFrontEnd::terminal, "terminal"}, {AlertFrontEnd::nobody, "nobody"}}};
+
+void takeDownShown(const std::shared_ptr<AlertHandle>& shown) {
+  // Each front end knows its own handles.
+  DesktopAlert::takeDown(shown);
+  TerminalAlert::takeDown(shown);
+}
+
+struct SessionAlertHandle final : AlertHandle {
+  SessionAlertHandle(SystemAlert& shower, std::shared_ptr<AlertHandle> alert) : frontEnd(shower), shown(std::move(alert)) {}
+  ~SessionAlertHandle() override {
+    lockWatch.reset();
+    frontEnd.releaseAlert(std::move(shown));
+  }
+
+  SystemAlert& frontEnd;
+  std::shared_ptr<AlertHandle> shown;
+  std::shared_ptr<const void> lockWatch;
+};
+
+}  // namespace
+
+std::string nameOf(AlertFrontEnd frontEnd) {
+  for (const auto& [candidate, name] : frontEndNames) {
+    if (candidate == frontEnd) return std::string(name);
+  }
+  return "nobody";
+}
+
+std::optional<AlertFrontEnd> alertFrontEndNamed(std::string_view word) {
+  for (const auto& [candidate, name] : frontEndNames) {
+    if (name == word) return candidate;
+  }
+  return std::nullopt;
+}
+
+SessionAlert::SessionAlert(const Options& options)
+    : _choice(options.choice || !options.terminal ? options.choice : AlertFrontEnd::terminal),
+      _hasTerminal(options.terminal.has_value()),
+      _hasUsableDisplay(options.hasUsableDisplay),
+      _watchLock(options.watchLock),
+      _desktop(options.desktop),
+      _terminal(options.terminal.value_or("")) {}
+
+bool SessionAlert::isUsable(AlertFrontEnd frontEnd) const {
+  switch (frontEnd) {
+    case AlertFrontEnd::desktop: return _desktop.isInstalled() && _hasUsableDisplay();
+    case AlertFrontEnd::terminal: return _hasTerminal && _terminal.isAvailable();
+    case AlertFrontEnd::nobody: break;
+  }
+  return true;
+}
+
+AlertFrontEnd SessionAlert::frontEnd() const {
+  if (_choice && isUsable(*_choice)) return *_choice;
+  for (const AlertFrontEnd candidate : {AlertFrontEnd::desktop, AlertFrontEnd::terminal}) {
+    if (isUsable(candidate)) return candidate;
+  }
+  return AlertFrontEnd::nobody;
+}
+
+std::optional<std::string> SessionAlert::trouble() const {
+  const AlertFrontEnd chosen = frontEnd();
+  if (_choice == chosen) return std::nullopt;
+  if (chosen == AlertFrontEnd::nobody) {
+    return "Nobody can be asked: there is no display that palisade-alert can use, and no terminal. Start accountd with "
+           "--terminal \"$(tty)\", or set terminal in accountd.toml.";
+  }
+  if (!_choice) return std::nullopt;
+  return "Alerts are to be shown by the " + nameOf(*_choice) + ", which cannot be used now; the " + nameOf(chosen) +
+         " shows them.";
+}
+
+std::shared_ptr<AlertHandle> SessionAlert::createAlert(AlertAllocator allocator, double timeoutSeconds, unsigned flags,
+                                                       int* errorPlace, const AlertDescription& description) {
+  const AlertFrontEnd chosen = frontEnd();
+  if (chosen == AlertFrontEnd::nobody) {
+    if (errorPlace != nullptr) *errorPlace = ENODEV;
+    return nullptr;
+  }
+  SystemAlert& shower =
+      chosen == AlertFrontEnd::desktop ? static_cast<SystemAlert&>(_desktop) : static_cast<SystemAlert&>(_terminal);
+  auto shown = shower.createAlert(allocator, timeoutSeconds, flags, errorPlace, description);
+  if (shown == nullptr) return nullptr;
+  const auto handle = std::make_shared<SessionAlertHandle>(shower, shown);
+  if (description.dismissOnLock) {
+    try {
+      handle->lockWatch = _watchLock([standing = std::weak_ptr(shown)] {
+        if (const auto alert = standing.lock()) takeDownShown(alert);
+      });
+    } catch (const std::exception&) {
+      // A session without a bus cannot say that it locks; its user is asked all the same.
+      handle->lockWatch = nullptr;
+    }
+  }
+  return handle;
+}
+
+int SessionAlert::receiveResponse(const std::shared_ptr<AlertHandle>& handle, double timeoutSeconds, AlertResponse& response) {
+  response = AlertResponseNobody;
+  const auto alert = std::dynamic_pointer_cast<SessionAlertHandle>(handle);
+  return alert == nullptr ? EINVAL : alert->frontEnd.receiveResponse(alert->shown, timeoutSeconds, response);
+}
+
+void SessionAlert::releaseAlert(std::shared_ptr<AlertHandle> handle) { handle.reset(); }
+
+void SessionAlert::takeDown(const std::shared_ptr<AlertHandle>& handle) {
+  if (const auto alert = std::dynamic_pointer_cast<SessionAlertHandle>(handle)) takeDownShown(alert->shown);
+}
+
+}  // namespace palisade

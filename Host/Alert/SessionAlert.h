@@ -1,0 +1,69 @@
+#pragma once
+
+/// The system alert of a session: asks wherever the user can be asked at that moment.
+///
+/// The front end is chosen for each alert: the configured one first, then a window of the desktop, then the terminal. When none
+/// of them can be used, nobody is asked. An alert that is to go when the session locks is taken down then, whatever shows it.
+/// Threads: as `SystemAlert` says; `takeDown`, `frontEnd` and `trouble` may be called from any thread. Ownership: a handle owns
+/// what shows it. Errors: an alert that no front end can show is a null handle, and nobody's answer.
+
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "Host/Alert/DesktopAlert.h"
+#include "Host/Alert/SessionDisplay.h"
+#include "Host/Alert/TerminalAlert.h"
+
+namespace palisade {
+
+enum class AlertFrontEnd { desktop, terminal, nobody };
+
+/// "desktop", "terminal", "nobody", and back; none for another word.
+std::string nameOf(AlertFrontEnd frontEnd);
+std::optional<AlertFrontEnd> alertFrontEndNamed(std::string_view name);
+
+class SessionAlert final : public SystemAlert {
+ public:
+  struct Options {
+    /// What was configured. A terminal that is named without it counts as chosen.
+    std::optional<AlertFrontEnd> choice = std::nullopt;
+    /// The terminal on which to ask; none asks on none.
+    std::optional<std::string> terminal = std::nullopt;
+    DesktopAlert::Options desktop;
+    std::function<bool()> hasUsableDisplay = palisade::hasUsableDisplay;
+    /// Calls its argument, from any thread, when the session locks, as long as the result lives. May throw when locks cannot be
+    /// heard of; the alert then stands through them.
+    std::function<std::shared_ptr<const void>(std::function<void()>)> watchLock = [](const auto&) { return nullptr; };
+  };
+
+  explicit SessionAlert(const Options& options);
+
+  /// What would show an alert now.
+  AlertFrontEnd frontEnd() const;
+
+  /// A sentence that says what to do when nobody can be asked, or when something else than what was configured asks.
+  std::optional<std::string> trouble() const;
+
+  std::shared_ptr<AlertHandle> createAlert(AlertAllocator allocator, double timeoutSeconds, unsigned flags, int* errorPlace,
+                                           const AlertDescription& description) override;
+  int receiveResponse(const std::shared_ptr<AlertHandle>& handle, double timeoutSeconds, AlertResponse& response) override;
+  void releaseAlert(std::shared_ptr<AlertHandle> handle) override;
+
+  /// Ends the wait for the alert's answer, which is then nobody's.
+  static void takeDown(const std::shared_ptr<AlertHandle>& handle);
+
+ private:
+  bool isUsable(AlertFrontEnd frontEnd) const;
+
+  std::optional<AlertFrontEnd> _choice;
+  bool _hasTerminal;
+  std::function<bool()> _hasUsableDisplay;
+  std::function<std::shared_ptr<const void>(std::function<void()>)> _watchLock;
+  DesktopAlert _desktop;
+  TerminalAlert _terminal;
+};
+
+}  // namespace palisade

@@ -1,0 +1,170 @@
+// Where a session's user is asked: what was configured first, then a window, then the terminal, then nobody.
+
+#include "Host/Alert/SessionAlert.h"
+
+#include <gmock/gmock.h>
+#include <stdlib.h>
+#include <sys/socket.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <cstring>
+#include <optional>
+
+#include "Tests/Host/Alert/PseudoTerminal.h"
+#include "Tests/Host/TemporaryFolder.h"
+
+namespace palisade {
+namespace {
+
+using FrontEnd = AlertFrontEnd;
+
+struct Situation {
+  const char* name;
+  std::optional<FrontEnd> choice;
+  bool hasDisplay;
+  bool hasTerminal;
+  FrontEnd expected;
+  bool isTrouble;
+};
+
+class ASession : public testing::TestWithParam<Situation> {};
+
+TEST_P(ASession, AsksWhereItCan) {
+  const Situation& situation = GetParam();
+  const PseudoTerminal terminal;
+  SessionAlert::Options options{.choice = situation.choice, .desktop = {.helper = SCRIPTED_HELPER}};
+  options.hasUsableDisplay = [&] { return situation.hasDisplay; };
+  if (situation.hasTerminal) options.terminal = terminal.path();
+  const SessionAlert alert(options);
+  EXPECT_EQ(alert.frontEnd(), situation.expected);
+  EXPECT_EQ(alert.trouble().has_value(), situation.isTrouble) << alert.trouble().value_or("");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    InAnySituation, ASession,
+    testing::Values(Situation{"NothingThere", std::nullopt, false, false, FrontEnd::nobody, true},
+                    Situation{"ADisplay", std::nullopt, true, false, FrontEnd::desktop, false},
+                    Situation{"ATerminal", std::nullopt, false, true, FrontEnd::terminal, false},
+                    Situation{"ANamedTerminalBesideADisplay", std::nullopt, true, true, FrontEnd::terminal, false},
+                    Situation{"TheDesktopChosen", FrontEnd::desktop, true, true, FrontEnd::desktop, false},
+                    Situation{"TheDesktopChosenWithoutADisplay", FrontEnd::desktop, false, true, FrontEnd::terminal, true},
+                    Situation{"TheDesktopChosenWithNothingThere", FrontEnd::desktop, false, false, FrontEnd::nobody, true},
+                    Situation{"TheTerminalChosenWithoutOne", FrontEnd::terminal, true, false, FrontEnd::desktop, true},
+                    Situation{"NobodyChosen", FrontEnd::nobody, true, true, FrontEnd::nobody, false}),
+    [](const auto& instance) { return instance.param.name; });
+
+class ADesktopSession : public testing::Test {
+ protected:
+  SessionAlert::Options options() {
+    SessionAlert::Options options{.desktop = {.helper = SCRIPTED_HELPER}};
+    options.hasUsableDisplay = [] { return true; };
+    options.watchLock = [this](auto onLock) {
+      _onLock = std::move(onLock);
+      return std::shared_ptr<const void>(this, [this](const void*) { _onLock = nullptr; });
+    };
+    return options;
+  }
+
+  static std::shared_ptr<AlertHandle> show(SessionAlert& alert, const std::string& orders, bool dismissOnLock = true) {
+    const AlertDescription description{.header = orders,
+                                       .message = "“Photos” asks.",
+                                       .alternateButtonTitle = "Don’t Allow",
+                                       .defaultButtonTitle = "Allow",
+                                       .dismissOnLock = dismissOnLock};
+    return alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, description);
+  }
+
+  static AlertResponse responseTo(SessionAlert& alert, const std::shared_ptr<AlertHandle>& handle) {
+    AlertResponse response = 42;
+    EXPECT_EQ(alert.receiveResponse(handle, 0, response), 0);
+    return response;
+  }
+
+  std::function<void()> _onLock;
+};
+
+TEST_F(ADesktopSession, PassesTheAnswerOn) {
+  SessionAlert alert(options());
+  EXPECT_EQ(responseTo(alert, show(alert, "allow")), AlertResponseDefaultButton);
+  EXPECT_EQ(responseTo(alert, show(alert, "refuse")), AlertResponseAlternateButton);
+}
+
+TEST_F(ADesktopSession, TakesItsAlertDownWhenItLocks) {
+  SessionAlert alert(options());
+  const auto handle = show(alert, "linger");
+  ASSERT_NE(_onLock, nullptr);
+  _onLock();
+  EXPECT_EQ(responseTo(alert, handle), AlertResponseNobody);
+}
+
+TEST_F(ADesktopSession, ListensToLocksOnlyWhileAnAlertStandsThatIsToGo) {
+  SessionAlert alert(options());
+  auto handle = show(alert, "linger", false);
+  EXPECT_EQ(_onLock, nullptr);
+  alert.releaseAlert(std::move(handle));
+  handle = show(alert, "linger");
+  EXPECT_NE(_onLock, nullptr);
+  alert.releaseAlert(std::move(handle));
+  EXPECT_EQ(_onLock, nullptr);
+}
+
+TEST_F(ADesktopSession, AsksEvenIfItCannotHearOfLocks) {
+  SessionAlert::Options deaf = options();
+  deaf.watchLock = [](const auto&) -> std::shared_ptr<const void> { throw std::runtime_error("no bus"); };
+  SessionAlert alert(deaf);
+  EXPECT_EQ(responseTo(alert, show(alert, "allow")), AlertResponseDefaultButton);
+}
+
+TEST_F(ADesktopSession, TakesAnAlertDownOnDemand) {
+  SessionAlert alert(options());
+  const auto handle = show(alert, "linger");
+  SessionAlert::takeDown(handle);
+  EXPECT_EQ(responseTo(alert, handle), AlertResponseNobody);
+}
+
+TEST(ASessionWithoutAnybody, ShowsNothingAndGetsNobodysAnswer) {
+  SessionAlert alert({.choice = FrontEnd::nobody, .desktop = {.helper = SCRIPTED_HELPER}});
+  int error = 0;
+  EXPECT_EQ(alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, &error, {}), nullptr);
+  EXPECT_NE(error, 0);
+  AlertResponse response = 0;
+  EXPECT_NE(alert.receiveResponse(nullptr, 0, response), 0);
+  EXPECT_EQ(response, AlertResponseNobody);
+}
+
+TEST(FrontEnds, HaveNames) {
+  for (const FrontEnd frontEnd : {FrontEnd::desktop, FrontEnd::terminal, FrontEnd::nobody}) {
+    EXPECT_EQ(alertFrontEndNamed(nameOf(frontEnd)), frontEnd);
+  }
+  EXPECT_EQ(alertFrontEndNamed("window"), std::nullopt);
+}
+
+TEST(ADisplay, IsUsableWhenItsServerTakesConnections) {
+  const TemporaryFolder folder;
+  setenv("XDG_RUNTIME_DIR", folder.path().c_str(), 1);
+  unsetenv("DISPLAY");
+  unsetenv("WAYLAND_DISPLAY");
+  EXPECT_FALSE(hasUsableDisplay());
+  for (const char* name : {"localhost:10.0", ":", ":x", ":4711", ":0/../x", ""}) {
+    setenv("DISPLAY", name, 1);
+    EXPECT_FALSE(hasUsableDisplay()) << name;
+  }
+  setenv("WAYLAND_DISPLAY", "wayland-7", 1);
+  EXPECT_FALSE(hasUsableDisplay());
+
+  const int server = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+  sockaddr_un address{};
+  address.sun_family = AF_UNIX;
+  std::strncpy(address.sun_path, (folder.path() / "wayland-7").c_str(), sizeof address.sun_path - 1);
+  ASSERT_EQ(bind(server, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+  EXPECT_FALSE(hasUsableDisplay()) << "nobody listens yet";
+  ASSERT_EQ(listen(server, 4), 0);
+  EXPECT_TRUE(hasUsableDisplay());
+  setenv("WAYLAND_DISPLAY", (folder.path() / "wayland-7").c_str(), 1);
+  EXPECT_TRUE(hasUsableDisplay());
+  close(server);
+}
+
+}  // namespace
+}  // namespace palisade
