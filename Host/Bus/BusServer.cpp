@@ -317,27 +317,31 @@ class BusServer::Implementation final : private OwnedConnection,
     const auto known = _callers.find(uniqueName);
     if (known != _callers.end()) return known->second;
     try {
+      const auto credentials = askBus<BusDictionary>("GetConnectionCredentials", uniqueName);
       BusCaller caller{.uniqueName = uniqueName,
-                       .processID = message->getCredsPid(),
-                       .userID = message->getCredsUid(),
+                       .processID = static_cast<pid_t>(credentials.at("ProcessID").get<std::uint32_t>()),
+                       .userID = credentials.at("UnixUserID").get<std::uint32_t>(),
                        .askProcessAgain = [this, uniqueName] { return processOf(uniqueName); }};
       return _callers.emplace(uniqueName, std::make_shared<const BusCaller>(std::move(caller))).first->second;
-    } catch (const sdbus::Error&) {
+    } catch (const std::exception&) {
       throw BusFailure(BusFailureKind::unknownCaller, "The bus does not say who is calling.");
     }
   }
 
-  // On a connection of its own: a call that waits for its reply must not take messages from under the loop.
   pid_t processOf(const std::string& uniqueName) {
+    return static_cast<pid_t>(askBus<std::uint32_t>("GetConnectionUnixProcessID", uniqueName));
+  }
+
+  // On a connection of its own: a call that waits for its reply must not take messages from under the loop, nor pile up those
+  // of a flood with all the descriptors that they carry.
+  template <typename Answer>
+  Answer askBus(const char* question, const std::string& uniqueName) {
     const std::lock_guard lock(_questionMutex);
     if (_questions == nullptr) _questions = sdbus::createSessionBusConnection();
     const auto bus = sdbus::createProxy(*_questions, "org.freedesktop.DBus", "/org/freedesktop/DBus");
-    std::uint32_t process = 0;
-    bus->callMethod("GetConnectionUnixProcessID")
-        .onInterface("org.freedesktop.DBus")
-        .withArguments(uniqueName)
-        .storeResultsTo(process);
-    return static_cast<pid_t>(process);
+    Answer answer{};
+    bus->callMethod(question).onInterface("org.freedesktop.DBus").withArguments(uniqueName).storeResultsTo(answer);
+    return answer;
   }
 
   void nameVanished(sdbus::Message& message) {

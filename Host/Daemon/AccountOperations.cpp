@@ -7,6 +7,7 @@
 #include "Host/Bus/BusLoop.h"
 #include "Host/Daemon/OperationStore.h"
 #include "Host/Preferences/TomlFile.h"
+#include "Host/Sqlite/SqliteError.h"
 #include "Platform/AccountConstants.h"
 #include "Platform/AccountType.h"
 
@@ -14,6 +15,7 @@ namespace palisade {
 namespace {
 
 constexpr std::size_t longestToken = 64 * 1024;
+constexpr std::size_t mostTokenTransfers = 64;
 
 Value textOrNull(const std::optional<std::string>& text) { return text ? Value(*text) : Value(); }
 
@@ -55,6 +57,15 @@ auto preferenceCall(const Call& call) {
 std::optional<std::string> textUnder(const Dictionary& options, std::string_view key) {
   const Value* value = options.find(key);
   return value == nullptr || value->string() == nullptr ? std::nullopt : std::optional(*value->string());
+}
+
+template <typename Call>
+auto storeCall(const Call& call) {
+  try {
+    return call();
+  } catch (const SqliteError& error) {
+    throw BusFailure(BusFailureKind::storeUnavailable, error.what());
+  }
 }
 
 void refuseUnlessStored(const std::optional<Error>& error) {
@@ -152,7 +163,7 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
 std::string AccountOperations::credential(const BusCaller& caller, const std::string& accountType) {
   const auto client = clientOf(caller);
   pluginFor(accountType);
-  const auto record = _parts.store.authorizationForClient(client, AccountType(accountType));
+  const auto record = storeCall([&] { return _parts.store.authorizationForClient(client, AccountType(accountType)); });
   if (record == nullptr || !record->isGranted()) {
     throw BusFailure(BusFailureKind::notGranted,
                      client->description() + " was not granted access. Ask with RequestAccess first.");
@@ -187,13 +198,17 @@ std::string AccountOperations::addAccount(const BusCaller& caller, const std::st
   refuseUnlessManager(caller);
   pluginFor(accountType);
   if (username.empty()) throw BusFailure(BusFailureKind::invalidArguments, "An account needs a user name.");
-  BusLoop::handOver();
   std::string token = receiveToken(caller, readToken);
   while (token.ends_with('\n') || token.ends_with('\r')) token.pop_back();
   if (token.empty() || token.size() > longestToken) {
     throw BusFailure(BusFailureKind::invalidArguments, "An account needs a token of at most 64 KiB.");
   }
-  const AccountRecord record = _parts.store.addAccount(accountType, username, username);
+  for (const AccountRecord& other : storeCall([&] { return _parts.store.accounts(); })) {
+    if (other.accountTypeIdentifier == accountType && other.username == username) {
+      throw BusFailure(BusFailureKind::invalidArguments, "There is an account '" + username + "' of this type already.");
+    }
+  }
+  const AccountRecord record = storeCall([&] { return _parts.store.addAccount(accountType, username, username); });
   const auto account = std::make_shared<StoredAccount>(record.id, record.username, record.description);
   account->setCredential(std::make_shared<const AccountCredential>(std::move(token), "", distantFuture));
   if (const auto error = _parts.keychain.setCredentialForAccount(account, std::nullopt)) {
@@ -203,13 +218,15 @@ std::string AccountOperations::addAccount(const BusCaller& caller, const std::st
   return record.id;
 }
 
-// Each transfer holds a thread, so a connection gets only so many.
+// Each transfer holds a thread and two descriptors, so there are only so many: of a connection, and of all together.
 std::string AccountOperations::receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken) {
   {
     const std::lock_guard lock(_mutex);
-    if (_tokenTransfers[caller.uniqueName] >= longestLane) {
+    std::size_t all = 0;
+    for (const auto& [connection, count] : _tokenTransfers) all += count;
+    if (all >= mostTokenTransfers || _tokenTransfers[caller.uniqueName] >= longestLane) {
       throw BusFailure(BusFailureKind::tooManyRequests,
-                       "This connection is sending " + std::to_string(longestLane) + " tokens already. Finish one first.");
+                       "Too many tokens are being sent. Finish one first, or try again later.");
     }
     ++_tokenTransfers[caller.uniqueName];
   }
@@ -218,12 +235,14 @@ std::string AccountOperations::receiveToken(const BusCaller& caller, const std::
     const auto transfers = _tokenTransfers.find(caller.uniqueName);
     if (--transfers->second == 0) _tokenTransfers.erase(transfers);
   });
+  // Whoever is refused costs no thread.
+  BusLoop::handOver();
   return readToken();
 }
 
 void AccountOperations::removeAccount(const BusCaller& caller, const std::string& id) {
   refuseUnlessManager(caller);
-  const auto accounts = _parts.store.accounts();
+  const auto accounts = storeCall([&] { return _parts.store.accounts(); });
   const auto found = std::ranges::find(accounts, id, &AccountRecord::id);
   if (found == accounts.end()) {
     throw BusFailure(BusFailureKind::noSuchAccount, "There is no account '" + id + "'. `palisade account list` shows them.");
@@ -237,13 +256,16 @@ void AccountOperations::removeAccount(const BusCaller& caller, const std::string
     throw BusFailure(BusFailureKind::keychainUnavailable,
                      error->description.value_or("The keychain kept the account's token."));
   }
-  _parts.store.removeAccount(id);
+  storeCall([&] { return _parts.store.removeAccount(id); });
 }
 
 Rows AccountOperations::listGrants(const BusCaller& caller, const std::string& accountType) {
   refuseUnlessManager(caller);
   Rows rows;
-  for (const StoredAuthorization& stored : _parts.store.storedAuthorizations(accountType)) rows.push_back(rowOf(stored));
+  for (const StoredAuthorization& stored : storeCall([&] { return _parts.store.storedAuthorizations(accountType); })) {
+    // What nobody answered is about to be removed.
+    if (!stored.isAnsweredByNobody) rows.push_back(rowOf(stored));
+  }
   return rows;
 }
 

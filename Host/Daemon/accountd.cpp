@@ -10,6 +10,7 @@
 
 #include "Host/Daemon/AccountDaemon.h"
 #include "Host/Daemon/Paths.h"
+#include "Host/Http/Environment.h"
 #include "Host/Preferences/TomlFile.h"
 #include "Host/Secrets/ProcessSecrecy.h"
 
@@ -68,6 +69,7 @@ int main(int argumentCount, char** arguments) {
       case palisade::CommandLineRequest::serve: break;
     }
     palisade::dropDumpable();
+    palisade::forgetNetworkEnvironment();
     return serve(configuration);
   } catch (const std::exception& failure) {
     std::cerr << "accountd: " << failure.what() << '\n';

@@ -58,6 +58,8 @@ def write(out: bytearray, kind: str, value) -> None:
     elif kind == "v":
         write(out, "g", value[0])
         write(out, value[0], value[1])
+    elif kind == "ay":
+        out += struct.pack("<I", len(value)) + value
     elif kind[0] == "a":
         length_at = len(out)
         out += bytes(4)

@@ -1,0 +1,311 @@
+#!/usr/bin/env python3
+"""What the daemon does when its surroundings fail: nothing is granted that was not, nothing is lost, and it says what is wrong."""
+
+import collections
+import contextlib
+import os
+import pathlib
+import resource
+import subprocess
+import unittest
+
+import trial
+from accounts import FACEBOOK, GRANTED, PENDING, REFUSED
+from bus_wire import BusError
+from trial import wait_until
+
+trial.use_build_of_command_line()
+
+PHOTOS = "org.example.photos"
+
+
+class AServerThatFails(unittest.TestCase):
+    FAULTS = ("close", "reset", "redirect", "unavailable", "status", "huge", "bomb", "transfer-bomb", "head", "deep", "types",
+              "duplicate", "text", "page", "garbage", "silent", "stall", "slow")
+
+    def test_in_any_way_grants_nothing_and_stands_in_nobodys_way(self):
+        with trial.trial_with_account(log="error") as session, session.caller() as caller:
+            session.kill_accountd()
+            with open(session.configuration / "server.toml", "a", encoding="utf-8") as server:
+                server.write("\n[limits]\ntotal_seconds = 2\nstall_seconds = 1\n")
+            session.start_accountd()
+            for fault in self.FAULTS:
+                with self.subTest(fault=fault):
+                    session.sandbox("fault", fault, "--path", "/oauth/authorization")
+                    word, results = caller.start_request().outcome()
+                    self.assertEqual(word, REFUSED)
+                    self.assertTrue(results.get("error_message"), results)
+                    self.assertEqual(caller.grants(), {})
+            session.sandbox("calm")
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+
+    def test_while_access_is_taken_back_is_asked_again_when_both_daemons_have_been_killed(self):
+        with trial.trial_with_account(log="error") as session, session.caller() as caller:
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+            session.sandbox("fault", "unavailable", "--times", "0")
+            vantad = session.start_vantad()
+            caller.manage("Revoke", "ss", [FACEBOOK, PHOTOS])
+            wait_until(lambda: caller.revocations()[0]["attempts"] > 0, "the server is asked")
+            vantad.kill()
+            vantad.wait()
+            session.kill_accountd()
+            session.start_accountd()
+            self.assertEqual([entry["state"] for entry in caller.revocations()], ["pending"])
+            session.sandbox("calm")
+            session.start_vantad()
+            wait_until(lambda: caller.revocations()[0]["state"] == "confirmed", "the server confirms")
+            self.assertNotIn('"valid":true', session.sandbox("tokens"))
+
+
+class Volume:
+    """A small disk of its own under the stores' folder."""
+
+    def __init__(self, session: trial.Trial):
+        self._session = session
+        self._folder = session.state
+        command = ["mount", "-t", "tmpfs", "-o", "size=4m,mode=700", "tmpfs", str(self._folder)]
+        mounted = subprocess.run(command, capture_output=True, text=True, check=False)
+        if mounted.returncode != 0:
+            raise unittest.SkipTest(f"No disk can be mounted here: {mounted.stderr.strip()}")
+
+    def __enter__(self):
+        return self
+
+    def __exit__(self, *_):
+        if self._session.accountd is not None and self._session.accountd.poll() is None:
+            self._session.kill_accountd()
+        subprocess.run(["umount", str(self._folder)], check=True)
+
+    def fill(self) -> None:
+        with open(self._folder / "ballast", "ab", buffering=0) as ballast:
+            try:
+                while True:
+                    ballast.write(bytes(4096))
+            except OSError:
+                pass
+
+    def free(self) -> None:
+        (self._folder / "ballast").unlink()
+
+    def remount(self, mode: str) -> None:
+        subprocess.run(["mount", "-o", f"remount,{mode}", str(self._folder)], check=True)
+
+
+class ADiskThat(unittest.TestCase):
+    def setUp(self):
+        self.session = self.enterContext(trial.Trial(log="error"))
+        self.volume = self.enterContext(Volume(self.session))
+        self.session.start_accountd()
+        self.session.add_account()
+        self.caller = self.enterContext(self.session.caller())
+
+    def granted(self) -> set[str]:
+        return {client for client, row in self.caller.grants().items() if row["granted"]}
+
+    def expect_a_grant_that_survives(self):
+        self.assertEqual(self.caller.start_request().outcome()[0], GRANTED)
+        self.session.kill_accountd()
+        self.session.start_accountd()
+        self.assertEqual(self.granted(), {PHOTOS})
+        self.assertTrue(self.caller.credential().startswith("sandbox-"))
+
+    def test_is_full_grants_nothing_and_says_so(self):
+        self.volume.fill()
+        word, results = self.caller.start_request().outcome()
+        self.assertEqual(word, REFUSED)
+        self.assertIn("full", results["error_message"])
+        self.assertEqual(self.granted(), set())
+        with self.assertRaises(BusError) as refused:
+            self.caller.credential()
+        self.assertEqual(refused.exception.name, "NotGranted")
+        self.volume.free()
+        self.expect_a_grant_that_survives()
+
+    def test_is_full_revokes_nothing_in_appearance_only(self):
+        self.assertEqual(self.caller.start_request().outcome()[0], GRANTED)
+        self.volume.fill()
+        for method, signature, values in (("Revoke", "ss", [FACEBOOK, PHOTOS]), ("RevokeAll", "s", [FACEBOOK])):
+            with self.subTest(method=method), self.assertRaises(BusError) as refused:
+                self.caller.manage(method, signature, values)
+            self.assertEqual(refused.exception.name, "StoreUnavailable")
+            self.assertIn("full", refused.exception.message)
+        self.volume.free()
+        self.caller.manage("Revoke", "ss", [FACEBOOK, PHOTOS])
+        self.assertEqual(self.granted(), set())
+
+    def test_is_full_takes_no_account(self):
+        self.volume.fill()
+        with self.assertRaises(BusError) as refused:
+            self.caller.add_account("grace", self.session.master_token)
+        self.assertIn(refused.exception.name, ("StoreUnavailable", "KeychainUnavailable"))
+        self.assertIn("full", refused.exception.message)
+        self.assertEqual([row["username"] for row in self.caller.manage("ListAccounts", "s", [""])[0]], ["ada"])
+
+    def test_is_read_only_stops_the_daemon_from_starting_with_a_sentence(self):
+        self.session.kill_accountd()
+        self.volume.remount("ro")
+        with self.assertRaises(RuntimeError) as failed:
+            self.session.start_accountd()
+        self.assertRegex(str(failed.exception), r"(?s)ended with 1: .*accountd: .*cannot be written")
+        self.volume.remount("rw")
+        self.session.start_accountd()
+        self.expect_a_grant_that_survives()
+
+
+class AKeychainThat(unittest.TestCase):
+    def test_cannot_be_written_lets_no_grant_stand_without_its_token(self):
+        with trial.trial_with_account(log="error") as session, session.caller() as caller:
+            blocker = subprocess.Popen(["python3", "-c", LOCK_A_STORE, session.state / "vault.sqlite"], stdin=subprocess.PIPE,
+                                       stdout=subprocess.PIPE)
+            try:
+                blocker.stdout.readline()
+                word, results = caller.start_request().outcome(timeout=40)
+                self.assertEqual(word, REFUSED)
+                self.assertIn("KeychainUnavailable", results["error_domain"])
+                self.assertIn("another process is using it", results["error_message"])
+                self.assertEqual([row["granted"] for row in caller.grants().values()], [])
+            finally:
+                blocker.communicate()
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+
+    def test_has_lost_its_key_stops_the_daemon_from_starting_with_a_sentence(self):
+        with trial.trial_with_account(log="error") as session:
+            session.kill_accountd()
+            key = session.state / "vault.key"
+            key.rename(key.with_suffix(".away"))
+            with self.assertRaises(RuntimeError) as failed:
+                session.start_accountd()
+            self.assertIn("vault.key is missing; put it back", str(failed.exception))
+            self.assertFalse(key.exists())
+
+
+# Holds a store's write lock until its standard input ends.
+LOCK_A_STORE = """
+import sqlite3, sys
+store = sqlite3.connect(sys.argv[1], isolation_level=None)
+store.execute("BEGIN IMMEDIATE")
+print("locked", flush=True)
+sys.stdin.read()
+"""
+
+
+class SeveralDaemons(unittest.TestCase):
+    def test_started_at_once_leave_one_that_serves(self):
+        with trial.trial_with_account(log="error") as session:
+            session.kill_accountd()
+            daemons = [session.start("accountd", stderr=subprocess.PIPE) for _ in range(6)]
+            wait_until(lambda: sum(daemon.poll() is not None for daemon in daemons) == 5, "all daemons but one have ended")
+            ended = [daemon for daemon in daemons if daemon.poll() is not None]
+            self.assertEqual([daemon.returncode for daemon in ended], [1] * 5)
+            for daemon in ended:
+                self.assertIn(b"Another account daemon serves this session already.", daemon.stderr.read())
+            with session.caller() as caller:
+                self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+
+
+class ADaemonWithFewDescriptors(unittest.TestCase):
+    def test_refuses_what_it_has_none_for_and_serves_the_others(self):
+        with trial.Trial(log="error") as session, contextlib.ExitStack() as crowd:
+            session.start_accountd(preexec_fn=lambda: resource.setrlimit(resource.RLIMIT_NOFILE, (256, 256)))
+            session.add_account()
+            caller = crowd.enter_context(session.caller())
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+            token = caller.credential()
+
+            reading, writing = os.pipe()
+            held = [(greedy, greedy.start("AddAccount", "ssha{sv}", [FACEBOOK, str(number), 0, {}], descriptors=[reading]))
+                    for greedy in [crowd.enter_context(session.caller()) for _ in range(40)] for number in range(10)]
+            os.close(reading)
+            self.assertEqual(caller.credential(), token)
+            self.assertEqual(caller.start_request(permissions=["email", "user_photos"]).outcome()[0], GRANTED)
+            os.close(writing)
+            names = collections.Counter(self.refusal_of(greedy, serial) for greedy, serial in held)
+            self.assertEqual(set(names), {"TooManyRequests", "InvalidArguments"})
+            self.assertEqual(len(caller.manage("ListAccounts", "s", [""])[0]), 1)
+
+    def refusal_of(self, caller, serial) -> str:
+        with self.assertRaises(BusError) as refused:
+            caller.reply_to(serial).answer()
+        return refused.exception.name
+
+
+class Changes(unittest.TestCase):
+    def test_are_told_to_whoever_listens(self):
+        with trial.Trial(log="error") as session, session.caller() as caller, session.caller() as listener:
+            session.start_accountd()
+            listener.listen()
+            account = caller.add_account("ada", session.master_token)
+            self.expect(listener, "AccountsChanged", [FACEBOOK])
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+            self.expect(listener, "GrantsChanged", [FACEBOOK, PHOTOS])
+            caller.manage("Revoke", "ss", [FACEBOOK, PHOTOS])
+            self.expect(listener, "GrantsChanged", [FACEBOOK, PHOTOS])
+            caller.manage("RevokeAll", "s", [FACEBOOK])
+            self.expect(listener, "GrantsChanged", [FACEBOOK, ""])
+            caller.manage("RemoveAccount", "s", [account])
+            self.expect(listener, "AccountsChanged", [FACEBOOK])
+
+    def expect(self, listener, member, values):
+        self.assertEqual(listener.signal(member).values, values)
+
+    def test_show_in_the_list_of_grants(self):
+        with trial.trial_with_account(log="error") as session, session.caller() as caller:
+            self.assertEqual(caller.grants(), {})
+            caller.start_request(permissions=["publish_actions", "email"], audience="FacebookAudienceFriends").outcome()
+            row = caller.grants()[PHOTOS]
+            self.assertEqual({key: row[key] for key in ("granted", "app_id", "audience", "permissions", "account_type", "name")},
+                             {"granted": True, "app_id": "1234567890", "audience": "FacebookAudienceFriends",
+                              "permissions": ["email", "publish_actions"], "account_type": FACEBOOK, "name": "Photos"})
+            caller.manage("Revoke", "ss", [FACEBOOK, PHOTOS])
+            row = caller.grants()[PHOTOS]
+            self.assertEqual((row["granted"], row["permissions"]), (False, []))
+            caller.manage("RevokeAll", "s", [FACEBOOK])
+            self.assertEqual(caller.grants(), {})
+
+
+class ASandboxedApplication(unittest.TestCase):
+    BOX = ("bwrap", "--die-with-parent", "--unshare-user", "--unshare-pid", "--ro-bind", "/usr", "/usr", "--symlink", "usr/bin",
+           "/bin", "--symlink", "usr/lib", "/lib", "--symlink", "usr/lib64", "/lib64", "--proc", "/proc", "--dev", "/dev")
+
+    def test_may_ask_for_itself_and_manage_nothing(self):
+        with trial.trial_with_account(log="error", answer="nothing") as session:
+            tried = session.run(*self.BOX, "true")
+            if tried.returncode != 0:
+                self.skipTest(f"No sandbox can be made here: {tried.stdout}")
+            info = session.root / "flatpak-info"
+            info.write_text("[Application]\nname=org.example.Boxed\n", encoding="utf-8")
+            boxed = (*self.BOX, "--bind", session.root, session.root, "--ro-bind", info, "/.flatpak-info")
+            manager = (*boxed, "gdbus", "call", "--session", "-d", "com.veltran.Accounts1", "-o", "/com/veltran/Accounts1", "-m")
+            for method, arguments in (("ListGrants", ["", "{}"]), ("ListAccounts", ["", "{}"]), ("History", ["{}"]),
+                                      ("Revoke", [FACEBOOK, PHOTOS, "{}"]), ("RevokeAll", [FACEBOOK, "{}"]),
+                                      ("Authorize", [FACEBOOK, "org.example.Boxed", "{}"]), ("ListClients", ["{}"]),
+                                      ("RemoveAccount", ["x", "{}"]), ("ListRevocations", ["{}"]), ("GetStatus", ["{}"]),
+                                      ("GetPreference", ["com.example", "x", "{}"]),
+                                      ("SetPreference", ["com.example", "x", "{}"])):
+                with self.subTest(method=method):
+                    output = session.run(*manager, f"com.veltran.Accounts1.Manager.{method}", *arguments).stdout
+                    self.assertIn("NotPermitted", output)
+            output = session.run(*manager, "com.veltran.Accounts1.Manager.RequestAccess", FACEBOOK,
+                                 "{'FacebookAppIdKey': <'1'>, 'FacebookPermissionsKey': <['email']>}", "{}").stdout
+            self.assertIn(f"uint32 {PENDING}", output)
+
+
+class AHostileEnvironment(unittest.TestCase):
+    def test_diverts_no_request_and_writes_no_secrets(self):
+        with trial.Trial(log="error") as session, session.caller() as caller:
+            keys = session.root / "keys"
+            session.start_accountd(environment={"https_proxy": "http://127.0.0.1:9", "HTTPS_PROXY": "http://127.0.0.1:9",
+                                                "ALL_PROXY": "socks5://127.0.0.1:9", "SSLKEYLOGFILE": str(keys),
+                                                "OPENSSL_CONF": "/nonexistent", "CURL_CA_BUNDLE": "/nonexistent"})
+            session.add_account()
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+            self.assertFalse(keys.exists())
+            token = caller.credential().encode()
+            process = pathlib.Path(f"/proc/{session.accountd.pid}")
+            if os.geteuid() == 0:
+                for file in ("cmdline", "environ"):
+                    self.assertNotIn(token, (process / file).read_bytes())
+
+
+if __name__ == "__main__":
+    unittest.main(verbosity=2)
