@@ -136,14 +136,14 @@ Gtk::Widget* AlertWindow::detailsOf(const AlertSubject& subject, std::string_vie
     auto* title = makeLabel(std::string(name), "dim-label", charactersOfALine / 2);
     title->set_valign(Gtk::ALIGN_START);
     auto* value = makeLabel(text, styleClass, charactersOfALine * 2 / 3);
-    value->get_accessible()->set_name(Glib::ustring(std::string(name)) + ": " + text);
+    if (!name.empty()) value->get_accessible()->set_name(Glib::ustring(std::string(name)) + ": " + text);
     grid->attach(*title, 0, row, 1, 1);
     grid->attach(*value, 1, row, 1, 1);
     ++row;
   };
-  Glib::ustring application = isolatedText(subject.applicationName);
-  if (subject.applicationID != subject.applicationName) application += "\n" + isolatedText(subject.applicationID);
-  addRow(words.application, application, "alert-detail");
+  // The identifier has a line of its own, so that each keeps to its side in either direction of writing.
+  addRow(words.application, isolatedText(subject.applicationName), "alert-detail");
+  if (subject.applicationID != subject.applicationName) addRow("", isolatedText(subject.applicationID), "alert-detail");
   addRow(words.identity, std::string(isCertain ? words.certain : words.claimed), isCertain ? "alert-certain" : "alert-claimed");
   if (!subject.account.empty()) addRow(words.account, isolatedText(subject.account), "alert-detail");
   return grid;
