@@ -114,9 +114,9 @@ void readCredential(sd_bus& bus) {
   answerTo(bus, call);
 }
 
-void revokeOwnGrant(sd_bus& bus) {
-  const Message call = newCall(bus, accounts, accountsPath, manager, "Revoke");
-  requireSuccess(sd_bus_message_append(call.get(), "ssa{sv}", facebook, "org.example.photos", 0), "The call cannot be written");
+void revokeEverything(sd_bus& bus) {
+  const Message call = newCall(bus, accounts, accountsPath, manager, "RevokeAll");
+  requireSuccess(sd_bus_message_append(call.get(), "sa{sv}", facebook, 0), "The call cannot be written");
   answerTo(bus, call);
 }
 

@@ -19,7 +19,9 @@ void requestGrantedAccess(sd_bus& bus);
 void requestAccessAndWait(sd_bus& bus);
 
 void readCredential(sd_bus& bus);
-void revokeOwnGrant(sd_bus& bus);
+
+/// Of one client it would leave a refusal behind, after which nobody is asked again.
+void revokeEverything(sd_bus& bus);
 
 /// Peers: another service's look-up of a stored decision, and of an authorization.
 void preparePermissionStore(sd_bus& bus);

@@ -20,6 +20,7 @@
 #include "Host/Daemon/OperationKeychain.h"
 #include "Host/Daemon/Paths.h"
 #include "Host/Daemon/PluginHost.h"
+#include "Host/Daemon/StateLock.h"
 #include "Host/Http/HttpClient.h"
 #include "Host/Identity/ClientRegistry.h"
 #include "Host/Json/Json.h"
@@ -85,7 +86,7 @@ class Directory final : public ClientDirectory {
 
 // In the order of construction: each part may use what stands above it.
 struct AccountDaemon::Parts {
-  explicit Parts(const DaemonConfiguration& configuration)
+  Parts(const DaemonConfiguration& configuration, SystemAlert* otherAlert)
       : clients(clientRecordFolders()),
         directory(clients),
         store({.path = stateFolder() / "accounts.sqlite", .onChange = [this](const StoreChange& change) { announce(change); }},
@@ -106,7 +107,8 @@ struct AccountDaemon::Parts {
                   .terminal = configuration.terminal,
                   .desktop = {.helper = alertHelper(), .subject = [this] { return subject(); }, .languages = alertLanguages},
                   .watchLock = [](auto onLock) { return std::make_shared<const SessionLock>(std::move(onLock)); }}),
-        alert(frontEnd, SessionAlert::takeDown),
+        alert(otherAlert != nullptr ? *otherAlert : frontEnd,
+              otherAlert != nullptr ? [](const std::shared_ptr<AlertHandle>&) {} : SessionAlert::takeDown),
         service({.store = store,
                  .history = history,
                  .keychain = *keychain,
@@ -117,7 +119,8 @@ struct AccountDaemon::Parts {
                  .status = [this] { return status(); }}),
         pluginKeychain(*keychain, store, [this](const std::string& clientID) { return service.operationOf(clientID); }),
         bus(service) {
-    // Only the owner of the bus name may repair: another daemon could be in the middle of a grant.
+    lock.emplace(stateFolder());
+    // Only the one daemon of these stores may repair: another could be in the middle of a grant.
     for (const std::string& sentence : repairAfterCrash(store, *keychain, outbox)) tell(sentence);
     if (!outbox.pending().empty()) bus.start(socialDaemonBusName);
     plugins.emplace(configuration.plugins, PlatformServices{.log = &log,
@@ -209,6 +212,7 @@ struct AccountDaemon::Parts {
     return report;
   }
 
+  std::optional<StateLock> lock;
   ClientRegistry clients;
   Directory directory;
   SqliteAccountStore store;
@@ -231,7 +235,8 @@ struct AccountDaemon::Parts {
   std::atomic<bool> isServing = false;
 };
 
-AccountDaemon::AccountDaemon(const DaemonConfiguration& configuration) : _parts(std::make_unique<Parts>(configuration)) {}
+AccountDaemon::AccountDaemon(const DaemonConfiguration& configuration, SystemAlert* alert)
+    : _parts(std::make_unique<Parts>(configuration, alert)) {}
 AccountDaemon::~AccountDaemon() = default;
 
 void AccountDaemon::run() {

@@ -8,12 +8,14 @@
 #include <memory>
 
 #include "Host/Daemon/Configuration.h"
+#include "Platform/SystemAlert.h"
 
 namespace palisade {
 
 class AccountDaemon {
  public:
-  explicit AccountDaemon(const DaemonConfiguration& configuration);
+  /// Asks the user of the session, or `alert`, which it borrows: the benchmarks' daemon answers by itself. accountd has none.
+  explicit AccountDaemon(const DaemonConfiguration& configuration, SystemAlert* alert = nullptr);
   ~AccountDaemon();
 
   AccountDaemon(const AccountDaemon&) = delete;
