@@ -58,6 +58,9 @@ class Stores:
         """The apps whose tokens are to be made invalid."""
         return {row[0] for row in self.ask("outbox.sqlite", "SELECT app_id FROM invalidations WHERE state = 'pending'")}
 
+    def are_half_done(self) -> bool:
+        return self.token_holders() != self.granted() or self.ask("accounts.sqlite", "SELECT * FROM intents") != []
+
     def damage(self) -> list[str]:
         answers = {name: self.ask(name, "PRAGMA integrity_check") for name in self.NAMES}
         return [f"{name} is damaged: {answer}" for name, answer in answers.items() if answer != [("ok",)]]

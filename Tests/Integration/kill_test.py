@@ -2,11 +2,13 @@
 """The daemon is killed at every point of each operation that changes what is granted, and started again.
 
 Real daemon, bus, stores, vault and server. The points are the daemon's calls that others can see (KillPoint.cpp): an operation is
-begun again and again from the same state, and ended one call later each time, until it comes to its end.
+begun again and again from the same state, and ended one call later each time, until it comes to its end. What a kill has left half
+done is mended by the next start; that start is killed too, at every seventh of its points.
 """
 
 import concurrent.futures
 import dataclasses
+import pathlib
 import shutil
 import sqlite3
 import unittest
@@ -20,6 +22,8 @@ from kill_points import KillPoints, Stores
 trial.use_build_of_command_line()
 
 LEAST_POINTS = 200
+# A start makes many calls, most of which write nothing.
+MENDING_STEP = 7
 PHOTOS = "org.example.photos"
 OTHERS = {"mail": "2000000001", "calendar": "2000000002"}
 APPS = {PHOTOS: "1234567890"} | {f"org.example.{name}": app for name, app in OTHERS.items()}
@@ -94,10 +98,15 @@ class Sweep:
         with trial.Trial(log="error") as self._trial:
             self._kill_points = KillPoints(self._trial)
             self._snapshot = self._trial.root / "snapshot"
+            # The first state that has to be mended.
+            self._half_done = self._trial.root / "half-done"
             self._prepare()
             number = self._first
             while self._cuts_at(number):
                 number += self._operation.lanes
+            number = self._first
+            while self._half_done.exists() and self._cuts_mending_at(number):
+                number += MENDING_STEP * self._operation.lanes
         return self
 
     def _start(self) -> None:
@@ -126,8 +135,7 @@ class Sweep:
 
     def _cuts_at(self, number: int) -> bool:
         """Whether the operation has a point of that number."""
-        shutil.rmtree(self._trial.state)
-        shutil.copytree(self._snapshot, self._trial.state)
+        self._restore(self._snapshot)
         self._kill_points.arm(0)
         self._start()
         self._trial.person.answer = self._operation.answer
@@ -139,14 +147,45 @@ class Sweep:
 
         place = f"{self._operation.name}, killed before call {number}, {call or 'at rest'}"
         left = Stores(self._trial.state, self._trial.root / "left")
+        if left.are_half_done() and not self._half_done.exists():
+            shutil.copytree(self._trial.state, self._half_done, ignore=shutil.ignore_patterns("*-shm"))
+        self._look_after(place, is_acknowledged, left)
+        if call:
+            self.places.append(place)
+        return bool(call)
+
+    def _cuts_mending_at(self, number: int) -> bool:
+        """Whether the start that mends what is half done has a point of that number."""
+        self._restore(self._half_done)
+        left = Stores(self._trial.state, self._trial.root / "left")
+        self._kill_points.arm(number)
+        try:
+            self._start()
+            with self._trial.caller() as caller:
+                caller.grants()
+        except (RuntimeError, BusError):
+            pass
+        call = self._kill_points.fatal_call()
+        if not call:
+            self._trial.kill_accountd()
+        self._trial.accountd.wait()
+        place = f"{self._operation.name}, killed and killed again while it is mended, before call {number}, {call or 'at rest'}"
+        self._look_after(place, False, left)
+        if call:
+            self.places.append(place)
+        return bool(call)
+
+    def _restore(self, state: pathlib.Path) -> None:
+        shutil.rmtree(self._trial.state)
+        shutil.copytree(state, self._trial.state)
+
+    def _look_after(self, place: str, is_acknowledged: bool, left: Stores) -> None:
+        """Starts the daemon again, notes what is wrong then, and ends it."""
         self._kill_points.arm(0)
         self._trial.person.answer = "nothing"
         self._start()
         self.problems += [f"{place}: {problem}" for problem in self._problems(is_acknowledged, left)]
         self._trial.kill_accountd()
-        if call:
-            self.places.append(place)
-        return bool(call)
 
     def _carry_out(self, number: int) -> bool:
         """Whether the operation was acknowledged."""

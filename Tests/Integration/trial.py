@@ -216,7 +216,7 @@ class Trial:
                 self.accountd = self.start("accountd", stderr=log, **more)
             while True:
                 try:
-                    change = listener.wait_for(lambda message: message.fields.get(MEMBER) == "NameOwnerChanged", 0.5)
+                    change = listener.wait_for(lambda message: message.fields.get(MEMBER) == "NameOwnerChanged", 0.05)
                     if change.values[2]:
                         return self.accountd
                 except TimeoutError:
