@@ -8,7 +8,6 @@ import time
 from accounts import FACEBOOK, GRANTED, MANAGER, NAME, OBJECT, Caller, facebook_options
 from bus_wire import ERROR, REPLY_SERIAL, Message
 
-OPTIONS = ("a{sv}", {})
 # What each connection asks, one after another without waiting; each begins at another question.
 QUESTIONS = [
     ("RequestAccess", "sa{sv}a{sv}", [FACEBOOK, facebook_options(), {}]),

@@ -7,7 +7,7 @@ import unittest
 import xml.etree.ElementTree
 
 import trial
-from accounts import FACEBOOK, GRANTED, MANAGER, NAME, OBJECT, PENDING, REFUSED, REQUEST, WITHDRAWN, Caller, facebook_options
+from accounts import FACEBOOK, GRANTED, MANAGER, NAME, OBJECT, PENDING, REFUSED, REQUEST, WITHDRAWN, facebook_options
 from bus_wire import BusError, marshalled
 from trial import wait_until
 
