@@ -5,7 +5,9 @@
 #include <systemd/sd-journal.h>
 #include <unistd.h>
 
+#include <cctype>
 #include <cstdio>
+#include <exception>
 #include <string>
 
 #include "Host/Log/Redaction.h"
@@ -22,12 +24,20 @@ std::string_view nameOf(LogLevel level) {
   return "debug";
 }
 
+void writeToStderr(LogLevel level, std::string_view message) {
+  std::string line = std::string(nameOf(level)) + ": ";
+  // A record is one line, and what it quotes does not steer the terminal that shows it.
+  for (const char character : message) line += std::iscntrl(static_cast<unsigned char>(character)) != 0 ? ' ' : character;
+  line += "\n";
+  std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
 }  // namespace
 
-JournalLog::JournalLog(LogLevel highestLevel, AuditSink audit)
+JournalLog::JournalLog(LogLevel highestLevel, AuditSink audit, const std::string& journalSocket)
     : _highestLevel(highestLevel),
       _audit(std::move(audit)),
-      _hasJournal(access("/run/systemd/journal/socket", W_OK) == 0) {}
+      _hasJournal(access(journalSocket.c_str(), W_OK) == 0) {}
 
 std::string_view JournalLog::destination() const { return _hasJournal ? "journal" : "stderr"; }
 
@@ -41,15 +51,15 @@ void JournalLog::write(const LogRecord& record) {
                                   static_cast<int>(record.level), nullptr);
     return;
   }
-  std::string line(nameOf(record.level));
-  for (const char character : message) line += character == '\n' ? ' ' : character;
-  line.insert(nameOf(record.level).size(), ": ");
-  line += "\n";
-  std::fwrite(line.data(), 1, line.size(), stderr);
+  writeToStderr(record.level, message);
 }
 
 void JournalLog::logAccessRequest(const AccessRequestRecord& request) {
-  if (_audit) _audit(request);
+  try {
+    if (_audit) _audit(request);
+  } catch (const std::exception& error) {
+    writeToStderr(LogLevel::error, redactedText(std::string("An access request is not in the history: ") + error.what()));
+  }
   record("logAccessRequest", request.userPrompted ? LogLevel::notice : LogLevel::debug, "Access to %@ for %@ was %@ (%@).",
          "accountTypeIdentifier, bundleID, granted, userPrompted", request.accountTypeIdentifier, request.bundleID,
          std::string_view(request.granted ? "granted" : "refused"),

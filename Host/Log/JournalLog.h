@@ -10,6 +10,7 @@
 
 #include <atomic>
 #include <functional>
+#include <string>
 
 #include "Platform/Log.h"
 
@@ -19,7 +20,8 @@ class JournalLog final : public Log {
  public:
   using AuditSink = std::function<void(const AccessRequestRecord&)>;
 
-  JournalLog(LogLevel highestLevel, AuditSink audit);
+  /// `journalSocket` is where a journal listens, if there is one.
+  JournalLog(LogLevel highestLevel, AuditSink audit, const std::string& journalSocket = "/run/systemd/journal/socket");
 
   bool isEnabled(LogLevel level) const override { return level <= _highestLevel; }
   void write(const LogRecord& record) override;
