@@ -23,6 +23,14 @@ bool isPressingKey(unsigned symbol) {
          symbol == GDK_KEY_KP_Space;
 }
 
+// Where there is no keyboard (a tablet, say), no window ever has its focus, and there are no keys that could go astray.
+bool hasKeyboard(GdkDisplay* display) {
+  GList* keyboards = gdk_seat_get_slaves(gdk_display_get_default_seat(display), GDK_SEAT_CAPABILITY_KEYBOARD);
+  const bool hasAny = keyboards != nullptr;
+  g_list_free(keyboards);
+  return hasAny;
+}
+
 }  // namespace
 
 AlertWindow::AlertWindow(const AlertQuestion& question, std::function<void(AlertWord)> answer)
@@ -36,7 +44,7 @@ AlertWindow::AlertWindow(const AlertQuestion& question, std::function<void(Alert
     this->answer(AlertWord::closed);
     return true;
   });
-  property_is_active().signal_changed().connect([this] { updateCondition(); });
+  property_is_active().signal_changed().connect([this] { updateFocus(); });
   gdk_event_handler_set(&AlertWindow::filter, this, nullptr);
 }
 
@@ -81,7 +89,10 @@ void AlertWindow::filterEvent(GdkEvent* event) {
     case GDK_VISIBILITY_NOTIFY:
       if (isOurs) _arming.setCovered(event->visibility.state != GDK_VISIBILITY_UNOBSCURED);
       break;
-    case GDK_MAP: _arming.setVisible(true); break;
+    case GDK_MAP:
+      _arming.setVisible(true);
+      updateFocus();
+      break;
     case GDK_UNMAP: _arming.setVisible(false); break;
     case GDK_WINDOW_STATE:
       if (isOurs) {
@@ -132,8 +143,8 @@ void AlertWindow::answer(AlertWord word) {
   if (const auto first = std::exchange(_answer, nullptr)) first(word);
 }
 
-void AlertWindow::updateCondition() {
-  const bool hasFocus = property_is_active().get_value();
+void AlertWindow::updateFocus() {
+  const bool hasFocus = property_is_active().get_value() || !hasKeyboard(get_display()->gobj());
   if (hasFocus == _hadFocus) return;
   _hadFocus = hasFocus;
   if (hasFocus) {

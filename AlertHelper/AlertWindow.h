@@ -38,7 +38,7 @@ class AlertWindow final : public Gtk::Window {
   void scroll(int pages);
   void answer(AlertWord word);
   void allowClicked();
-  void updateCondition();
+  void updateFocus();
   bool showWhetherArmed();
 
   std::function<void(AlertWord)> _answer;
