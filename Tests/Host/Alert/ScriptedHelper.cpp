@@ -1,10 +1,9 @@
 // A desktop helper that does what the question's title tells it, for tests of how it may end.
 //
 // The title is a list of orders: "allow", "refuse", "close" write that answer; "prefix N" the first N bytes of consent;
-// "foreign" consent to another question; "text WORD"; "signal N"; "exit N"; "linger" never ends; "environment" writes its
-// environment to the file that the message names.
+// "foreign" consent to another question; "text WORD"; "signal N"; "exit N"; "linger" ends only with the host; "environment"
+// writes its environment to the file that the message names.
 
-#include <sys/prctl.h>
 #include <sys/resource.h>
 #include <sys/socket.h>
 #include <unistd.h>
@@ -61,7 +60,7 @@ void obey(const std::string& order, std::istringstream& rest, const AlertQuestio
   } else if (order == "exit" && rest >> number) {
     _exit(number);
   } else if (order == "linger") {
-    while (true) pause();
+    receiveExactly(1);
   } else if (order == "environment") {
     std::ofstream out(question.message);
     for (char** entry = environ; *entry != nullptr; ++entry) out << *entry << '\n';
@@ -73,7 +72,6 @@ void obey(const std::string& order, std::istringstream& rest, const AlertQuestio
 }  // namespace
 
 int main() {
-  prctl(PR_SET_PDEATHSIG, SIGKILL, 0, 0, 0);
   const rlimit noCoreFiles{.rlim_cur = 0, .rlim_max = 0};
   setrlimit(RLIMIT_CORE, &noCoreFiles);
   const AlertQuestion question = receiveQuestion();
