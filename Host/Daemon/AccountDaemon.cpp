@@ -112,6 +112,7 @@ struct AccountDaemon::Parts {
         service({.store = store,
                  .history = history,
                  .keychain = *keychain,
+                 .outbox = outbox,
                  .clients = clients,
                  .preferences = preferences,
                  .pluginFor = [this](std::string_view accountType) { return plugins->pluginFor(accountType); },

@@ -8,6 +8,7 @@
 #include "Host/Daemon/OperationStore.h"
 #include "Host/Preferences/TomlFile.h"
 #include "Host/Sqlite/SqliteError.h"
+#include "Host/Vantad/Departures.h"
 #include "Platform/AccountConstants.h"
 #include "Platform/AccountType.h"
 
@@ -251,12 +252,10 @@ void AccountOperations::removeAccount(const BusCaller& caller, const std::string
   const auto first = std::ranges::find(accounts, found->accountTypeIdentifier, &AccountRecord::accountTypeIdentifier);
   if (first == found) revokeAll(caller, found->accountTypeIdentifier);
   BusLoop::handOver();
-  const auto account = std::make_shared<StoredAccount>(found->id, found->username, found->description);
-  if (const auto error = _parts.keychain.removeCredentialForAccount(account, std::nullopt)) {
-    throw BusFailure(BusFailureKind::keychainUnavailable,
-                     error->description.value_or("The keychain kept the account's token."));
-  }
+  // The account's token signs the invalidations that are still to come, so it goes when they are settled.
+  storeCall([&] { _parts.outbox.noteDeparture(id); });
   storeCall([&] { return _parts.store.removeAccount(id); });
+  storeCall([&] { removeTokensOfDepartedAccounts(_parts.outbox, _parts.keychain); });
 }
 
 Rows AccountOperations::listGrants(const BusCaller& caller, const std::string& accountType) {

@@ -21,6 +21,7 @@
 #include "Host/Identity/ClientRegistry.h"
 #include "Host/Keychain/Keychain.h"
 #include "Host/Preferences/TomlPreferencesStore.h"
+#include "Host/Vantad/Outbox.h"
 #include "Platform/AccountAccessPlugin.h"
 
 namespace palisade {
@@ -34,6 +35,7 @@ class AccountOperations final : public AccountsService {
     SqliteAccountStore& store;
     AccessHistory& history;
     Keychain& keychain;
+    Outbox& outbox;
     const ClientRegistry& clients;
     TomlPreferencesStore& preferences;
     PluginFinder pluginFor;

@@ -5,12 +5,18 @@ namespace palisade {
 ClientLanes::Turn ClientLanes::enter(const std::string& client, Bound bound, const std::function<void()>& beforeWaiting) {
   std::unique_lock lock(_mutex);
   Lane& lane = _lanes[client];
-  if (bound == Bound::kept && lane.nextTicket - lane.served >= _longest) {
+  if (bound == Bound::kept && lane.size() >= _longest) {
     throw LaneIsFull("This application has " + std::to_string(_longest) +
                      " unanswered requests already. Wait for an answer, or close one.");
   }
-  const std::uint64_t ticket = lane.nextTicket++;
-  waitUntil(lock, beforeWaiting, [&] { return lane.served == ticket && !_isTakenByOne; });
+  const std::uint64_t ticket = _nextTicket++;
+  lane.push_back(ticket);
+  try {
+    waitUntil(lock, beforeWaiting, [&] { return lane.front() == ticket && !_isTakenByOne; });
+  } catch (...) {
+    giveUp(client, ticket);
+    throw;
+  }
   ++_active;
   return {*this, client};
 }
@@ -19,7 +25,12 @@ ClientLanes::Turn ClientLanes::enterAll(const std::function<void()>& beforeWaiti
   std::unique_lock lock(_mutex);
   waitUntil(lock, beforeWaiting, [&] { return !_isTakenByOne; });
   _isTakenByOne = true;
-  waitUntil(lock, beforeWaiting, [&] { return _active == 0; });
+  try {
+    waitUntil(lock, beforeWaiting, [&] { return _active == 0; });
+  } catch (...) {
+    leave(std::nullopt);
+    throw;
+  }
   return {*this, std::nullopt};
 }
 
@@ -32,13 +43,24 @@ void ClientLanes::waitUntil(std::unique_lock<std::mutex>& lock, const std::funct
   _hasMoved.wait(lock, isTrue);
 }
 
+void ClientLanes::giveUp(const std::string& client, std::uint64_t ticket) {
+  {
+    const std::lock_guard lock(_mutex);
+    const auto lane = _lanes.find(client);
+    std::erase(lane->second, ticket);
+    if (lane->second.empty()) _lanes.erase(lane);
+  }
+  _hasMoved.notify_all();
+}
+
 void ClientLanes::leave(const std::optional<std::string>& client) {
   {
     const std::lock_guard lock(_mutex);
     if (client) {
       --_active;
       const auto lane = _lanes.find(*client);
-      if (++lane->second.served == lane->second.nextTicket) _lanes.erase(lane);
+      lane->second.pop_front();
+      if (lane->second.empty()) _lanes.erase(lane);
     } else {
       _isTakenByOne = false;
     }

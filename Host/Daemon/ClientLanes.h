@@ -3,10 +3,13 @@
 /// Keeps the operations of one client in order, one at a time, and their number bounded.
 ///
 /// Threads: both `enter`s block the calling thread until its turn has come; `beforeWaiting` is called if there is something to
-/// wait for. Ownership: a turn ends when its object goes away. Errors: `LaneIsFull` when a client has too many operations.
+/// wait for. Ownership: a turn ends when its object goes away. Errors: `LaneIsFull` when a client has too many operations;
+/// whoever throws in `beforeWaiting` gives its turn up.
 
 #include <condition_variable>
+#include <cstddef>
 #include <cstdint>
+#include <deque>
 #include <functional>
 #include <map>
 #include <mutex>
@@ -50,11 +53,10 @@ class ClientLanes {
   [[nodiscard]] Turn enterAll(const std::function<void()>& beforeWaiting);
 
  private:
-  struct Lane {
-    std::uint64_t nextTicket = 0;
-    std::uint64_t served = 0;
-  };
+  /// The tickets of one client's operations; the first one's turn it is.
+  using Lane = std::deque<std::uint64_t>;
 
+  void giveUp(const std::string& client, std::uint64_t ticket);
   void leave(const std::optional<std::string>& client);
   void waitUntil(std::unique_lock<std::mutex>& lock, const std::function<void()>& beforeWaiting,
                  const std::function<bool()>& isTrue);
@@ -63,6 +65,7 @@ class ClientLanes {
   std::mutex _mutex;
   std::condition_variable _hasMoved;
   std::map<std::string, Lane> _lanes;
+  std::uint64_t _nextTicket = 0;
   /// Operations whose turn it is.
   std::size_t _active = 0;
   /// Somebody has, or waits for, everybody's turn: nobody else's begins.

@@ -5,6 +5,7 @@
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Accounts/StoredAccount.h"
 #include "Host/Keychain/Keychain.h"
+#include "Host/Vantad/Departures.h"
 #include "Host/Vantad/Outbox.h"
 #include "Platform/AccountConstants.h"
 #include "Platform/AccountType.h"
@@ -31,6 +32,10 @@ class Repair {
 
   std::vector<std::string> carryOut() {
     _store.removeAllAnswersByNobody();
+    attempt("The removal of accounts could not be finished: ", [&] {
+      for (const std::string& accountID : _outbox.departures()) _store.removeAccount(accountID);
+      removeTokensOfDepartedAccounts(_outbox, _keychain);
+    });
     const auto accounts = _store.accounts();
     for (const Intent& intent : _store.intents()) {
       const auto account = std::ranges::find(accounts, intent.accountTypeIdentifier, &AccountRecord::accountTypeIdentifier);

@@ -5,7 +5,6 @@
 #include <sys/stat.h>
 
 #include <cerrno>
-#include <chrono>
 #include <cstring>
 #include <stdexcept>
 #include <thread>
@@ -13,7 +12,6 @@
 namespace palisade {
 namespace {
 
-constexpr std::chrono::seconds patience{5};
 constexpr std::chrono::milliseconds pause{20};
 
 FileDescriptor openFile(const std::filesystem::path& path) {
@@ -32,7 +30,7 @@ void makeFolder(const std::filesystem::path& folder) {
 
 }  // namespace
 
-StateLock::StateLock(const std::filesystem::path& stateFolder)
+StateLock::StateLock(const std::filesystem::path& stateFolder, std::chrono::milliseconds patience)
     : _file((makeFolder(stateFolder), openFile(stateFolder / "accountd.lock"))) {
   const auto end = std::chrono::steady_clock::now() + patience;
   while (flock(_file.number(), LOCK_EX | LOCK_NB) != 0) {

@@ -17,7 +17,7 @@ namespace {
 constexpr std::int32_t outboxApplicationID = 0x506c4f62;  // "PlOb" in ASCII
 
 // A step that has been released never changes; a new one is put behind it. Dates are seconds since 1970, uptimes milliseconds.
-constexpr std::array<std::string_view, 1> migrations{R"sql(
+constexpr std::array<std::string_view, 2> migrations{R"sql(
   CREATE TABLE invalidations (
     id INTEGER PRIMARY KEY AUTOINCREMENT,
     account_id TEXT NOT NULL,
@@ -34,6 +34,9 @@ constexpr std::array<std::string_view, 1> migrations{R"sql(
     settled_at INTEGER
   ) STRICT;
   CREATE INDEX invalidations_pending ON invalidations (id) WHERE state = 'pending';
+)sql",
+                                                     R"sql(
+  CREATE TABLE departures (account_id TEXT PRIMARY KEY) STRICT, WITHOUT ROWID;
 )sql"};
 
 // A date that is none is read as -1.
@@ -59,21 +62,32 @@ struct OutboxWriter {
                  "UPDATE invalidations SET attempts = attempts + 1, last_attempt_at = ?2, next_attempt_at = ?3,"
                  " held_by_server = ?4, last_error = ?5 WHERE id = ?1 AND state = 'pending'"),
         removeSettled(database, "forget settled invalidations",
-                      "DELETE FROM invalidations WHERE state <> 'pending' AND settled_at < ?1") {}
+                      "DELETE FROM invalidations WHERE state <> 'pending' AND settled_at < ?1"),
+        noteDeparture(database, "note the removal of an account", "INSERT OR IGNORE INTO departures (account_id) VALUES (?1)"),
+        forgetDeparture(database, "forget the removal of an account", "DELETE FROM departures WHERE account_id = ?1") {}
 
   Statement add;
   Statement settle;
   Statement postpone;
   Statement removeSettled;
+  Statement noteDeparture;
+  Statement forgetDeparture;
 };
 
 struct OutboxReader {
   explicit OutboxReader(Database& database)
       : pending(database, "list the pending invalidations", pendingQuery),
-        latest(database, "list the invalidations", latestQuery) {}
+        latest(database, "list the invalidations", latestQuery),
+        departures(database, "list the removed accounts", "SELECT account_id FROM departures ORDER BY account_id"),
+        settledDepartures(
+            database, "list the removed accounts that are settled",
+            "SELECT account_id FROM departures WHERE NOT EXISTS (SELECT 1 FROM invalidations"
+            " WHERE state = 'pending' AND invalidations.account_id = departures.account_id) ORDER BY account_id") {}
 
   Statement pending;
   Statement latest;
+  Statement departures;
+  Statement settledDepartures;
 };
 
 std::int64_t secondsOf(Date date) { return date.time_since_epoch().count(); }
@@ -107,6 +121,12 @@ std::vector<Invalidation> readAll(Statement::Run run) {
                        .settledAt = optionalDate(12)});
   }
   return entries;
+}
+
+std::vector<std::string> readTexts(Statement::Run run) {
+  std::vector<std::string> texts;
+  while (run.next()) texts.push_back(run.text(0));
+  return texts;
 }
 
 }  // namespace
@@ -174,6 +194,22 @@ void Outbox::postpone(std::int64_t id, Date nextAttempt, bool isHeldByServer, st
 
 void Outbox::removeSettledBefore(Date date) {
   _store->write([&](Database&, const OutboxWriter& writer) { writer.removeSettled.execute(secondsOf(date)); });
+}
+
+void Outbox::noteDeparture(std::string_view accountID) {
+  _store->write([&](Database&, const OutboxWriter& writer) { writer.noteDeparture.execute(accountID); });
+}
+
+std::vector<std::string> Outbox::departures() {
+  return _store->read([](const OutboxReader& reader) { return readTexts(reader.departures.run()); });
+}
+
+std::vector<std::string> Outbox::settledDepartures() {
+  return _store->read([](const OutboxReader& reader) { return readTexts(reader.settledDepartures.run()); });
+}
+
+void Outbox::forgetDeparture(std::string_view accountID) {
+  _store->write([&](Database&, const OutboxWriter& writer) { writer.forgetDeparture.execute(accountID); });
 }
 
 std::filesystem::path Outbox::bellOf(const std::filesystem::path& outbox) { return outbox.string() + ".bell"; }

@@ -75,6 +75,15 @@ class Outbox {
   /// The latest entries in every state, the latest first.
   std::vector<Invalidation> latest(std::size_t limit);
 
+  /// \name Removed accounts, whose own tokens the entries still need
+  ///@{
+  void noteDeparture(std::string_view accountID);
+  std::vector<std::string> departures();
+  /// Those for which no entry is pending.
+  std::vector<std::string> settledDepartures();
+  void forgetDeparture(std::string_view accountID);
+  ///@}
+
   /// \name For the social daemon. An entry that has been settled already stays as it is.
   ///@{
   void confirm(std::int64_t id);

@@ -14,6 +14,7 @@
 
 #include "Host/Accounts/StoredAccount.h"
 #include "Host/Preferences/TomlFile.h"
+#include "Host/Vantad/Departures.h"
 #include "Platform/Log.h"
 
 namespace palisade {
@@ -108,7 +109,9 @@ Vantad::Reason Vantad::serve(const ServerConfiguration& configuration) {
 
 std::optional<std::chrono::milliseconds> Vantad::advance(Courier& courier) {
   try {
-    return courier.advance();
+    const auto wait = courier.advance();
+    removeTokensOfDepartedAccounts(_outbox, _keychain);
+    return wait;
   } catch (const SqliteError& error) {
     _log.record("Vantad::advance", LogLevel::error, "%@", "error", std::string_view(error.what()));
     return afterAFailure;

@@ -56,6 +56,19 @@ class AServerThatFails(unittest.TestCase):
             wait_until(lambda: caller.revocations()[0]["state"] == "confirmed", "the server confirms")
             self.assertNotIn('"valid":true', session.sandbox("tokens"))
 
+    def test_while_an_account_is_removed_is_asked_again_with_the_accounts_own_token(self):
+        with trial.trial_with_account(log="error") as session, session.caller() as caller:
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+            session.sandbox("fault", "unavailable", "--times", "0")
+            session.start_vantad()
+            caller.manage("RemoveAccount", "s", [caller.manage("ListAccounts", "s", [""])[0][0]["id"]])
+            self.assertEqual(caller.manage("ListAccounts", "s", [""]), [[]])
+            wait_until(lambda: caller.revocations()[0]["attempts"] > 0, "the server is asked")
+            session.sandbox("calm")
+            wait_until(lambda: caller.revocations()[0]["state"] == "confirmed", "the server confirms")
+            self.assertNotIn('"valid":true', session.sandbox("tokens"))
+            wait_until(lambda: session.stored_tokens() == 0, "the account's token is removed")
+
 
 class Volume:
     """A small disk of its own under the stores' folder."""

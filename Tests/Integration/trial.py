@@ -1,5 +1,6 @@
 """A session for tests: a private bus, a Facebook server, both daemons and a person, each of which a test can start, stop and alter."""
 
+import contextlib
 import os
 import pathlib
 import pty
@@ -7,6 +8,7 @@ import re
 import select
 import shutil
 import signal
+import sqlite3
 import subprocess
 import sys
 import tempfile
@@ -241,6 +243,11 @@ class Trial:
     def add_account(self) -> str:
         with self.caller() as manager:
             return manager.add_account("ada", self.master_token)
+
+    def stored_tokens(self) -> int:
+        """How many tokens the vault holds: the account's own, and one a grant."""
+        with contextlib.closing(sqlite3.connect(self.state / "vault.sqlite")) as vault:
+            return vault.execute("SELECT count(*) FROM credentials").fetchone()[0]
 
     def sandbox(self, *words) -> str:
         return self.run("palisade-sandbox", *words).stdout

@@ -144,4 +144,18 @@ TEST(TheClock, TellsTheBootAndGoesOn) {
   EXPECT_GE(elapsed(first, presentMoment()), 0ms);
 }
 
+TEST_F(AnOutbox, SaysThatARemovedAccountIsSettledWhenNothingOfItIsPending) {
+  Outbox outbox = open();
+  outbox.add("removed", "app");
+  outbox.add("other", "app");
+  outbox.noteDeparture("removed");
+  outbox.noteDeparture("removed");
+  EXPECT_THAT(outbox.departures(), ElementsAre("removed"));
+  EXPECT_THAT(outbox.settledDepartures(), IsEmpty());
+  outbox.confirm(outbox.pending().front().id);
+  EXPECT_THAT(outbox.settledDepartures(), ElementsAre("removed"));
+  outbox.forgetDeparture("removed");
+  EXPECT_THAT(open().departures(), IsEmpty());
+}
+
 }  // namespace
