@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cstring>
 #include <fstream>
+#include <iterator>
 #include <sstream>
 
 namespace palisade {
@@ -72,6 +73,10 @@ toml::table tableFromDictionary(const Dictionary& dictionary) {
   return table;
 }
 
+[[noreturn]] void failToRead(const std::filesystem::path& path) {
+  throw TomlError(path.string() + " cannot be read: " + std::strerror(errno) + ".");
+}
+
 [[noreturn]] void failToWrite(const std::filesystem::path& path) {
   throw TomlError(path.string() + " cannot be written: " + std::strerror(errno) + ".");
 }
@@ -82,10 +87,14 @@ std::optional<Dictionary> readTomlFile(const std::filesystem::path& path) {
   std::ifstream file(path);
   if (!file) {
     if (errno == ENOENT || errno == ENOTDIR) return std::nullopt;
-    throw TomlError(path.string() + " cannot be read: " + std::strerror(errno) + ".");
+    failToRead(path);
   }
   try {
-    return dictionaryFromToml(toml::parse(file, path.string()));
+    // Read here: the parser takes a failure, such as a folder's, for the end of the file.
+    const std::string content(std::istreambuf_iterator<char>(file), {});
+    return dictionaryFromToml(toml::parse(content, path.string()));
+  } catch (const std::ios_base::failure&) {
+    failToRead(path);
   } catch (const toml::parse_error& error) {
     throw TomlError(path.string() + ", line " + std::to_string(error.source().begin.line) + ", column " +
                     std::to_string(error.source().begin.column) + ": " + std::string(error.description()) + ".");

@@ -4,7 +4,7 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <cerrno>
+#include <cstdint>
 #include <system_error>
 
 #include "Host/Preferences/TomlFile.h"
@@ -29,7 +29,7 @@ TomlPreferencesStore::TomlPreferencesStore(std::filesystem::path folder) : _fold
     std::filesystem::permissions(_folder, std::filesystem::perms::owner_all, ignored);
   }
   _watch = inotify_init1(IN_CLOEXEC | IN_NONBLOCK);
-  if (_watch >= 0) inotify_add_watch(_watch, _folder.c_str(), IN_MOVED_TO | IN_CLOSE_WRITE | IN_DELETE);
+  watchFolder();
 }
 
 TomlPreferencesStore::~TomlPreferencesStore() {
@@ -72,12 +72,20 @@ const Dictionary& TomlPreferencesStore::read(const std::string& domain) {
   return _domains.emplace(domain, readTomlFile(fileOf(domain)).value_or(Dictionary())).first->second;
 }
 
+void TomlPreferencesStore::watchFolder() {
+  constexpr std::uint32_t changes = IN_CREATE | IN_CLOSE_WRITE | IN_MOVED_TO | IN_MOVED_FROM | IN_DELETE;
+  _isWatching = _watch >= 0 && inotify_add_watch(_watch, _folder.c_str(), changes | IN_DELETE_SELF | IN_MOVE_SELF) >= 0;
+}
+
 void TomlPreferencesStore::forgetWhatChanged() {
   alignas(inotify_event) char events[4096];
   // Without a watch nothing tells of changes, so nothing is remembered.
-  bool hasChanged = _watch < 0;
+  bool hasChanged = !_isWatching;
   while (_watch >= 0 && ::read(_watch, events, sizeof events) > 0) hasChanged = true;
-  if (hasChanged) _domains.clear();
+  if (!hasChanged) return;
+  // The folder of this name may be another one by now, or may have come only now.
+  watchFolder();
+  _domains.clear();
 }
 
 }  // namespace palisade

@@ -34,10 +34,12 @@ class TomlPreferencesStore final : public PreferencesStore {
  private:
   std::filesystem::path fileOf(std::string_view domain) const;
   const Dictionary& read(const std::string& domain);
+  void watchFolder();
   void forgetWhatChanged();
 
   const std::filesystem::path _folder;
   int _watch = -1;
+  bool _isWatching = false;
   std::mutex _mutex;
   std::map<std::string, Dictionary> _domains;
 };
