@@ -29,13 +29,13 @@ std::optional<BusFailure> Operation::failure() const {
 }
 
 void Operation::withdraw() {
-  std::shared_ptr<const std::function<void()>> interrupt;
+  std::set<std::shared_ptr<const std::function<void()>>> interrupts;
   {
     const std::lock_guard lock(_mutex);
     _isWithdrawn.store(true, std::memory_order_release);
-    interrupt = _interrupt;
+    interrupts = _interrupts;
   }
-  if (interrupt != nullptr) (*interrupt)();
+  for (const auto& interrupt : interrupts) (*interrupt)();
 }
 
 std::shared_ptr<const void> Operation::interruptWith(std::function<void()> interrupt) {
@@ -43,13 +43,13 @@ std::shared_ptr<const void> Operation::interruptWith(std::function<void()> inter
   bool isWithdrawnAlready = false;
   {
     const std::lock_guard lock(_mutex);
-    _interrupt = registered;
+    _interrupts.insert(registered);
     isWithdrawnAlready = isWithdrawn();
   }
   if (isWithdrawnAlready) (*registered)();
   return std::shared_ptr<const void>(registered.get(), [this, registered](const void*) {
     const std::lock_guard lock(_mutex);
-    _interrupt = nullptr;
+    _interrupts.erase(registered);
   });
 }
 

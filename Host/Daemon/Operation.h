@@ -11,6 +11,7 @@
 #include <memory>
 #include <mutex>
 #include <optional>
+#include <set>
 
 #include "Host/Accounts/Intent.h"
 #include "Host/Bus/AccountsService.h"
@@ -61,7 +62,7 @@ class Operation {
   std::atomic<bool> _userAnswered = false;
   std::atomic<bool> _wentUnanswered = false;
   mutable std::mutex _mutex;
-  std::shared_ptr<const std::function<void()>> _interrupt;
+  std::set<std::shared_ptr<const std::function<void()>>> _interrupts;
   std::optional<BusFailure> _failure;
 };
 

@@ -1,0 +1,133 @@
+#include "Host/Daemon/Operation.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <functional>
+#include <memory>
+#include <thread>
+
+namespace palisade {
+namespace {
+
+using testing::MockFunction;
+
+TEST(AnOperation, AnnouncesItsFirstWaitOnce) {
+  MockFunction<void()> announce;
+  EXPECT_CALL(announce, Call).Times(1);
+  Operation operation(announce.AsStdFunction());
+  operation.aboutToWait();
+  operation.aboutToWait();
+}
+
+TEST(AnOperation, AnnouncesNothingWhenItNeverWaits) {
+  MockFunction<void()> announce;
+  EXPECT_CALL(announce, Call).Times(0);
+  Operation operation(announce.AsStdFunction());
+  operation.withdraw();
+}
+
+TEST(AnOperation, NeedsNobodyToAnnounceItsWaitTo) { EXPECT_NO_THROW(Operation(nullptr).aboutToWait()); }
+
+TEST(AnOperation, InterruptsItsWaitWhenItIsWithdrawn) {
+  MockFunction<void()> interrupt;
+  Operation operation(nullptr);
+  const auto registration = operation.interruptWith(interrupt.AsStdFunction());
+  EXPECT_FALSE(operation.isWithdrawn());
+  EXPECT_CALL(interrupt, Call).WillOnce([&] { EXPECT_TRUE(operation.isWithdrawn()); });
+  operation.withdraw();
+  EXPECT_TRUE(operation.isWithdrawn());
+}
+
+TEST(AnOperation, InterruptsAWaitThatBeginsAfterItsWithdrawalAtOnce) {
+  MockFunction<void()> interrupt;
+  Operation operation(nullptr);
+  operation.withdraw();
+  EXPECT_CALL(interrupt, Call).Times(1);
+  const auto registration = operation.interruptWith(interrupt.AsStdFunction());
+}
+
+TEST(AnOperation, LeavesAWaitAloneThatIsOver) {
+  MockFunction<void()> interrupt;
+  EXPECT_CALL(interrupt, Call).Times(0);
+  Operation operation(nullptr);
+  operation.interruptWith(interrupt.AsStdFunction()).reset();
+  operation.withdraw();
+}
+
+TEST(AnOperation, InterruptsEveryWaitThatIsNotOver) {
+  MockFunction<void()> outer;
+  MockFunction<void()> inner;
+  MockFunction<void()> over;
+  Operation operation(nullptr);
+  const auto first = operation.interruptWith(outer.AsStdFunction());
+  const auto second = operation.interruptWith(inner.AsStdFunction());
+  operation.interruptWith(over.AsStdFunction()).reset();
+  EXPECT_CALL(outer, Call).Times(1);
+  EXPECT_CALL(inner, Call).Times(1);
+  EXPECT_CALL(over, Call).Times(0);
+  operation.withdraw();
+}
+
+TEST(AnOperation, MayEndAWaitFromItsInterruption) {
+  Operation operation(nullptr);
+  std::shared_ptr<const void> registration;
+  registration = operation.interruptWith([&] { registration.reset(); });
+  operation.withdraw();
+  EXPECT_EQ(registration, nullptr);
+}
+
+TEST(AnOperation, IsWithdrawnFromAnotherThreadWhateverItDoesJustThen) {
+  for (int attempt = 0; attempt < 100; ++attempt) {
+    Operation operation(nullptr);
+    std::atomic<int> interruptions = 0;
+    const auto registered = [&] {
+      std::jthread other([&] { operation.withdraw(); });
+      return operation.interruptWith([&] { ++interruptions; });
+    }();
+    EXPECT_EQ(interruptions, 1);
+  }
+}
+
+TEST(AnOperation, IsLeftUnansweredWhenItIsWithdrawnOrItsAlertIs) {
+  Operation operation(nullptr);
+  EXPECT_FALSE(operation.isLeftUnanswered());
+  Operation withdrawn(nullptr);
+  withdrawn.withdraw();
+  EXPECT_TRUE(withdrawn.isLeftUnanswered());
+  operation.alertWentUnanswered();
+  EXPECT_TRUE(operation.isLeftUnanswered());
+  EXPECT_FALSE(operation.isWithdrawn());
+  EXPECT_FALSE(operation.isAnsweredByUser());
+}
+
+TEST(AnOperation, KnowsItsFirstFailure) {
+  Operation operation(nullptr);
+  EXPECT_FALSE(operation.failure());
+  operation.fail(BusFailure(BusFailureKind::storeUnavailable, "The disk is full."));
+  operation.fail(BusFailure(BusFailureKind::failed, "And more."));
+  ASSERT_TRUE(operation.failure());
+  EXPECT_EQ(operation.failure()->kind(), BusFailureKind::storeUnavailable);
+  EXPECT_STREQ(operation.failure()->what(), "The disk is full.");
+}
+
+TEST(TheCurrentOperation, IsItsThreadsAloneAsLongAsItIsCarried) {
+  Operation operation(nullptr);
+  EXPECT_EQ(Operation::current(), nullptr);
+  {
+    const OperationScope scope(operation);
+    EXPECT_EQ(Operation::current(), &operation);
+    std::jthread([&] {
+      EXPECT_EQ(Operation::current(), nullptr);
+      Operation another(nullptr);
+      const OperationScope anotherScope(another);
+      EXPECT_EQ(Operation::current(), &another);
+    }).join();
+    EXPECT_EQ(Operation::current(), &operation);
+  }
+  EXPECT_EQ(Operation::current(), nullptr);
+}
+
+}  // namespace
+}  // namespace palisade
