@@ -106,7 +106,8 @@ void Courier::send(const Invalidation& invalidation) {
     return;
   }
 
-  // How old the wish is tells the server which tokens it means. After a restart of the machine nobody knows: it means all.
+  // How old the wish is tells the server which tokens it means: one that was issued before it must not seem to be younger.
+  // After a restart of the machine nobody knows: it means all.
   const auto age = elapsed(invalidation.requested, _parts.clock()).value_or(std::chrono::milliseconds(0));
   _underWay = invalidation;
   _transfer = _parts.http.send(_parts.server.invalidation(invalidation.appID, age, token),

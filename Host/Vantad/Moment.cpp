@@ -1,5 +1,6 @@
 #include "Host/Vantad/Moment.h"
 
+#include <algorithm>
 #include <ctime>
 #include <fstream>
 
@@ -26,7 +27,8 @@ Moment presentMoment() {
 
 std::optional<std::chrono::milliseconds> elapsed(const Moment& from, const Moment& until) {
   if (from.boot.empty() || from.boot != until.boot || from.uptime > until.uptime) return std::nullopt;
-  return until.uptime - from.uptime;
+  // Both were cut off to whole milliseconds, so the difference may be one too large.
+  return std::max(until.uptime - from.uptime - std::chrono::milliseconds(1), std::chrono::milliseconds(0));
 }
 
 }  // namespace palisade

@@ -24,7 +24,7 @@ using Clock = std::function<Moment()>;
 
 Moment presentMoment();
 
-/// The time from one to the other; none when the machine was started in between, or might have been.
+/// The time that has passed from one to the other, at least; none when the machine was started in between, or might have been.
 std::optional<std::chrono::milliseconds> elapsed(const Moment& from, const Moment& until);
 
 }  // namespace palisade
