@@ -5,6 +5,7 @@
 ///
 /// Threads: see `AccountsService`. One operation of a client at a time, in order; operations of different clients run beside
 /// each other. A revocation first withdraws what its client waits for. Ownership: borrows its parts. Errors: `BusFailure`.
+//  Contents: 1 Requests (AccountOperations.cpp)  2 Management (AccountOperationsManagement.cpp)
 
 #include <functional>
 #include <map>

@@ -1,0 +1,251 @@
+#include <algorithm>
+#include <future>
+
+#include "Host/Accounts/StoredAccount.h"
+#include "Host/Bus/BusLoop.h"
+#include "Host/Daemon/AccountOperations.h"
+#include "Host/Daemon/AtEnd.h"
+#include "Host/Daemon/OperationStore.h"
+#include "Host/Daemon/StoreCall.h"
+#include "Host/Preferences/TomlFile.h"
+#include "Host/Vantad/Departures.h"
+#include "Platform/AccountConstants.h"
+#include "Platform/AccountType.h"
+
+// What the person who manages accounts and grants asks for. Every operation refuses a sandboxed caller first.
+
+namespace palisade {
+namespace {
+
+constexpr std::size_t longestToken = 64 * 1024;
+constexpr std::size_t mostTokenTransfers = 64;
+
+Value textOrNull(const std::optional<std::string>& text) { return text ? Value(*text) : Value(); }
+
+Array namesOf(const PermissionSetRef& permissions) {
+  if (permissions == nullptr) return {};
+  std::vector<std::string> names(permissions->begin(), permissions->end());
+  std::ranges::sort(names);
+  return {names.begin(), names.end()};
+}
+
+std::int64_t unixTime(Date date) { return date.time_since_epoch().count(); }
+
+Value optionOf(const ClientAuthorization& record, std::string_view key) {
+  const Value* value = record.options() == nullptr ? nullptr : record.options()->find(key);
+  return value == nullptr ? Value() : *value;
+}
+
+Dictionary rowOf(const StoredAuthorization& stored) {
+  const ClientAuthorization& record = *stored.record;
+  return {{"client", stored.clientID},
+          {"name", record.client()->localizedAppName()},
+          {"account_type", stored.accountTypeIdentifier},
+          {"granted", record.isGranted()},
+          {"app_id", optionOf(record, FacebookAppIdKey)},
+          {"audience", optionOf(record, FacebookAudienceKey)},
+          {"permissions", namesOf(record.grantedPermissions())},
+          {"changed", unixTime(stored.updatedAt)}};
+}
+
+template <typename Call>
+auto preferenceCall(const Call& call) {
+  try {
+    return call();
+  } catch (const TomlError& error) {
+    throw BusFailure(BusFailureKind::invalidArguments, error.what());
+  }
+}
+
+}  // namespace
+
+Rows AccountOperations::listAccounts(const BusCaller& caller, const std::string& accountType) {
+  refuseUnlessManager(caller);
+  Rows rows;
+  for (const AccountRecord& account : _parts.store.accounts()) {
+    if (!accountType.empty() && account.accountTypeIdentifier != accountType) continue;
+    rows.push_back({{"id", account.id},
+                    {"account_type", account.accountTypeIdentifier},
+                    {"username", account.username},
+                    {"description", account.description}});
+  }
+  return rows;
+}
+
+std::string AccountOperations::addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
+                                          const std::function<std::string()>& readToken) {
+  refuseUnlessManager(caller);
+  pluginFor(accountType);
+  if (username.empty()) throw BusFailure(BusFailureKind::invalidArguments, "An account needs a user name.");
+  std::string token = receiveToken(caller, readToken);
+  while (token.ends_with('\n') || token.ends_with('\r')) token.pop_back();
+  if (token.empty() || token.size() > longestToken) {
+    throw BusFailure(BusFailureKind::invalidArguments, "An account needs a token of at most 64 KiB.");
+  }
+  for (const AccountRecord& other : storeCall([&] { return _parts.store.accounts(); })) {
+    if (other.accountTypeIdentifier == accountType && other.username == username) {
+      throw BusFailure(BusFailureKind::invalidArguments, "There is an account '" + username + "' of this type already.");
+    }
+  }
+  const AccountRecord record = storeCall([&] { return _parts.store.addAccount(accountType, username, username); });
+  const auto account = std::make_shared<StoredAccount>(record.id, record.username, record.description);
+  account->setCredential(std::make_shared<const AccountCredential>(std::move(token), "", distantFuture));
+  if (const auto error = _parts.keychain.setCredentialForAccount(account, std::nullopt)) {
+    _parts.store.removeAccount(record.id);
+    throw BusFailure(BusFailureKind::keychainUnavailable, error->description.value_or("The keychain refused the token."));
+  }
+  return record.id;
+}
+
+// Each transfer holds a thread and two descriptors, so there are only so many: of a connection, and of all together.
+std::string AccountOperations::receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken) {
+  {
+    const std::lock_guard lock(_mutex);
+    std::size_t all = 0;
+    for (const auto& [connection, count] : _tokenTransfers) all += count;
+    if (all >= mostTokenTransfers || _tokenTransfers[caller.uniqueName] >= longestLane) {
+      throw BusFailure(BusFailureKind::tooManyRequests,
+                       "Too many tokens are being sent. Finish one first, or try again later.");
+    }
+    ++_tokenTransfers[caller.uniqueName];
+  }
+  const AtEnd finished([&] {
+    const std::lock_guard lock(_mutex);
+    const auto transfers = _tokenTransfers.find(caller.uniqueName);
+    if (--transfers->second == 0) _tokenTransfers.erase(transfers);
+  });
+  // Whoever is refused costs no thread.
+  BusLoop::handOver();
+  return readToken();
+}
+
+void AccountOperations::removeAccount(const BusCaller& caller, const std::string& id) {
+  refuseUnlessManager(caller);
+  const auto accounts = storeCall([&] { return _parts.store.accounts(); });
+  const auto found = std::ranges::find(accounts, id, &AccountRecord::id);
+  if (found == accounts.end()) {
+    throw BusFailure(BusFailureKind::noSuchAccount, "There is no account '" + id + "'. `palisade account list` shows them.");
+  }
+  // What was granted belongs to the first account of its type; only that one's removal takes it along.
+  const auto first = std::ranges::find(accounts, found->accountTypeIdentifier, &AccountRecord::accountTypeIdentifier);
+  if (first == found) revokeAll(caller, found->accountTypeIdentifier);
+  BusLoop::handOver();
+  // The account's token signs the invalidations that are still to come, so it goes when they are settled.
+  storeCall([&] { _parts.outbox.noteDeparture(id); });
+  storeCall([&] { return _parts.store.removeAccount(id); });
+  storeCall([&] { removeTokensOfDepartedAccounts(_parts.outbox, _parts.keychain); });
+}
+
+Rows AccountOperations::listGrants(const BusCaller& caller, const std::string& accountType) {
+  refuseUnlessManager(caller);
+  Rows rows;
+  for (const StoredAuthorization& stored : storeCall([&] { return _parts.store.storedAuthorizations(accountType); })) {
+    // What nobody answered is about to be removed.
+    if (!stored.isAnsweredByNobody) rows.push_back(rowOf(stored));
+  }
+  return rows;
+}
+
+void AccountOperations::revoke(const BusCaller& caller, const std::string& accountType, const std::string& clientID) {
+  refuseUnlessManager(caller);
+  const auto stored = _parts.store.storedAuthorizations(accountType);
+  const auto found = std::ranges::find(stored, clientID, &StoredAuthorization::clientID);
+  std::shared_ptr<const Client> client;
+  if (found != stored.end()) {
+    client = found->record->client();
+  } else {
+    client = registeredClient(clientID);
+  }
+  withdraw([&](const Running& running) { return running.client == clientID; });
+  BusLoop::handOver();
+  const auto turn = _lanes.enter(clientID, ClientLanes::Bound::waived, [] {});
+  refuseUnlessStored(
+      _parts.store.noteIntent({.kind = Intent::Kind::revocation, .accountTypeIdentifier = accountType, .clientID = clientID}));
+  manage(accountType, [&](auto& plugin, const auto& type, const auto& store, auto completion) {
+    plugin.revokeAccessToAccountsOfType(type, client, store, std::move(completion));
+  });
+  // A client that never had a record gets none.
+  _parts.store.forgetIntent(AccountType(accountType), clientID);
+}
+
+void AccountOperations::revokeAll(const BusCaller& caller, const std::string& accountType) {
+  refuseUnlessManager(caller);
+  withdraw([](const Running&) { return true; });
+  BusLoop::handOver();
+  const auto turn = _lanes.enterAll([] {});
+  refuseUnlessStored(_parts.store.noteRemovalOfAllClients(AccountType(accountType)));
+  manage(accountType, [&](auto& plugin, const auto& type, const auto& store, auto completion) {
+    plugin.revokeAllAccessToAccountsOfType(type, store, std::move(completion));
+  });
+}
+
+// A revocation says that it was handled, or why it was not.
+void AccountOperations::manage(const std::string& accountType, const PluginCall& call) {
+  const auto plugin = pluginFor(accountType);
+  const auto operation = std::make_shared<Operation>(nullptr);
+  operation->userHasAnswered();
+  const OperationScope scope(*operation);
+  std::promise<AccessOutcome> outcome;
+  call(*plugin, std::make_shared<const AccountType>(accountType), std::make_shared<OperationStore>(_parts.store, operation),
+       [&](bool handled, const std::optional<Error>& error) {
+         outcome.set_value({.response = handled ? AccessResponse::granted : AccessResponse::refused, .error = error});
+       });
+  const AccessOutcome result = outcome.get_future().get();
+  if (result.response != AccessResponse::granted) {
+    throw BusFailure(BusFailureKind::failed, result.error && result.error->description ? *result.error->description
+                                                                                       : "The revocation was not carried out.");
+  }
+  if (const auto failure = operation->failure()) throw BusFailure(*failure);
+}
+
+Rows AccountOperations::history(const BusCaller& caller, std::uint32_t limit, const std::optional<std::string>& client) {
+  refuseUnlessManager(caller);
+  Rows rows;
+  for (const HistoryEntry& entry : _parts.history.entries({.limit = limit, .bundleID = client})) {
+    rows.push_back({{"time", unixTime(entry.at)},
+                    {"account_type", entry.accountTypeIdentifier},
+                    {"client", textOrNull(entry.bundleID)},
+                    {"granted", entry.granted},
+                    {"prompted", entry.userPrompted},
+                    {"elapsed", entry.elapsedSeconds}});
+  }
+  return rows;
+}
+
+Rows AccountOperations::listRevocations(const BusCaller& caller) {
+  refuseUnlessManager(caller);
+  return _parts.revocations();
+}
+
+Rows AccountOperations::listClients(const BusCaller& caller) {
+  refuseUnlessManager(caller);
+  Rows rows;
+  for (const auto& client : _parts.clients.clients()) {
+    rows.push_back({{"bundle_id", textOrNull(client->bundleID())},
+                    {"name", client->localizedAppName()},
+                    {"class", nameOf(client->clientClass())},
+                    {"entitlements", Array(client->entitlements().begin(), client->entitlements().end())},
+                    {"file", client->recordFile()}});
+  }
+  return rows;
+}
+
+std::optional<Value> AccountOperations::preference(const BusCaller& caller, const std::string& domain, const std::string& key) {
+  refuseUnlessManager(caller);
+  return preferenceCall(
+      [&] { return _parts.preferences.copyValue(key, domain, PreferencesUser::current, PreferencesHost::any); });
+}
+
+void AccountOperations::setPreference(const BusCaller& caller, const std::string& domain, const std::string& key,
+                                      const std::optional<Value>& value) {
+  refuseUnlessManager(caller);
+  BusLoop::handOver();
+  preferenceCall([&] { _parts.preferences.set(domain, key, value); });
+}
+
+Dictionary AccountOperations::status(const BusCaller& caller) {
+  refuseUnlessManager(caller);
+  return _parts.status();
+}
+
+}  // namespace palisade
