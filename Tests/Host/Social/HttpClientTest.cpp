@@ -38,8 +38,8 @@ TEST(AnAnswer, ArrivesWithItsStatusItsTypeAndItsBody) {
 
 TEST(AHandler, RunsOnAThreadThatIsNotItsCallers) {
   Sandbox sandbox;
-  HttpClient client(sandbox.trusted());
   std::promise<std::thread::id> handlers;
+  HttpClient client(sandbox.trusted());
   const auto transfer =
       client.send(meRequest(sandbox), [&handlers](const HttpResult&) { handlers.set_value(std::this_thread::get_id()); });
   EXPECT_NE(handlers.get_future().get(), std::this_thread::get_id());
@@ -47,9 +47,10 @@ TEST(AHandler, RunsOnAThreadThatIsNotItsCallers) {
 
 TEST(AHandler, MayTakeItsTimeWithoutDelayingOthers) {
   Sandbox sandbox;
-  HttpClient client(sandbox.trusted());
+  // The client, which goes first, waits for its handlers; they may use these until then.
   std::promise<void> isRunning;
   std::promise<void> mayEnd;
+  HttpClient client(sandbox.trusted());
   const auto slow = client.send(meRequest(sandbox), [&](const HttpResult&) {
     isRunning.set_value();
     mayEnd.get_future().wait();
@@ -156,8 +157,8 @@ TEST(TheEnvironment, GetsNoKeysOfConnections) {
 TEST(AProxy, IsUsedWhenItIsConfiguredAndNeverSeesTheToken) {
   Sandbox sandbox;
   ListeningSocket proxy;
-  HttpClient client(sandbox.trusted({.proxy = "http://" + proxy.name()}));
   std::promise<HttpResult> result;
+  HttpClient client(sandbox.trusted({.proxy = "http://" + proxy.name()}));
   const auto transfer =
       client.send(meRequest(sandbox, "the-token"), [&result](HttpResult answer) { result.set_value(std::move(answer)); });
   const std::string heard = proxy.hearVisitor();
@@ -168,8 +169,8 @@ TEST(AProxy, IsUsedWhenItIsConfiguredAndNeverSeesTheToken) {
 TEST(ARequestThatIsLetGo, IsCancelled) {
   Sandbox sandbox;
   sandbox.arm({{"kind", "silent"}});
-  HttpClient client(sandbox.trusted());
   std::promise<HttpResult> result;
+  HttpClient client(sandbox.trusted());
   auto transfer = client.send(meRequest(sandbox), [&result](HttpResult answer) { result.set_value(std::move(answer)); });
   transfer.reset();
   EXPECT_EQ(codeOf(result.get_future().get()), HttpErrorCancelled);

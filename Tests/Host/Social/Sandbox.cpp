@@ -49,10 +49,11 @@ Array Sandbox::requests() { return *control("/requests").array(); }
 Array Sandbox::tokens() { return *control("/tokens").array(); }
 
 HttpResult ask(HttpClient& client, HttpRequest request) {
-  std::promise<HttpResult> promise;
+  // The handler may still be on its way out when its result is here.
+  const auto promise = std::make_shared<std::promise<HttpResult>>();
   const auto transfer =
-      client.send(std::move(request), [&promise](HttpResult result) { promise.set_value(std::move(result)); });
-  return promise.get_future().get();
+      client.send(std::move(request), [promise](HttpResult result) { promise->set_value(std::move(result)); });
+  return promise->get_future().get();
 }
 
 HttpRequest meRequest(const Sandbox& sandbox, std::optional<std::string> token) {

@@ -17,9 +17,9 @@ using namespace palisade;
 namespace {
 
 HttpAnswer ask(HttpClient& http, HttpRequest request) {
-  std::promise<HttpResult> promise;
-  const auto transfer = http.send(std::move(request), [&promise](HttpResult result) { promise.set_value(std::move(result)); });
-  HttpResult result = promise.get_future().get();
+  const auto promise = std::make_shared<std::promise<HttpResult>>();
+  const auto transfer = http.send(std::move(request), [promise](HttpResult result) { promise->set_value(std::move(result)); });
+  HttpResult result = promise->get_future().get();
   if (const Error* error = std::get_if<Error>(&result)) {
     std::fprintf(stderr, "%s\n", error->description.value_or("no description").c_str());
     std::exit(EXIT_FAILURE);
