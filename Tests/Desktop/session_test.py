@@ -13,14 +13,9 @@ import unittest
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
 BUILD = pathlib.Path(sys.argv.pop(1))
 
-# The session asks on a terminal until it is told otherwise.
 ASK_IN_A_WINDOW = """
 palisade account add ada <"$XDG_RUNTIME_DIR/palisade-sandbox/master-token" >/dev/null
-kill "$(cat "$PALISADE_TRIAL/accountd.pid")"
-until ! palisade --version >/dev/null || ! kill -0 "$(cat "$PALISADE_TRIAL/accountd.pid")" 2>/dev/null; do sleep 0.05; done
-sed -i 's/^terminal = .*/alert = "desktop"/' "$XDG_CONFIG_HOME/palisade/accountd.toml"
-accountd 2>>"$PALISADE_TRIAL/accountd.log" & daemon=$!
-until palisade clients >/dev/null 2>&1; do sleep 0.05; done
+daemon=$(cat "$PALISADE_TRIAL/accountd.pid")
 window() { xdotool search --onlyvisible --class palisade-alert >/dev/null 2>&1; }
 until_window() { local try; for try in $(seq 400); do window && return; sleep 0.05; done; echo "no window"; }
 # A second is twenty looks.
@@ -33,7 +28,7 @@ press() { local try; for try in $(seq 20); do xdotool key "$1"; sleep 0.8; windo
 
 def session(script):
     """What the script prints, its errors among it."""
-    environment = dict(os.environ, PALISADE_ANSWER="nothing", NO_COLOR="1")
+    environment = dict(os.environ, PALISADE_ALERT="desktop", PALISADE_ANSWER="nothing", NO_COLOR="1")
     finished = subprocess.run([PROJECT / "Tools/Trial/session", BUILD, "bash", "-c", ASK_IN_A_WINDOW + script], env=environment,
                               text=True, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, timeout=120,
                               check=False)
