@@ -1,8 +1,5 @@
 #include "Host/Strings/GettextStringTable.h"
 
-#include <boost/locale/gnu_gettext.hpp>
-#include <boost/locale/message.hpp>
-#include <locale>
 #include <map>
 #include <mutex>
 #include <utility>
@@ -13,53 +10,35 @@
 namespace palisade {
 namespace {
 
-using Messages = boost::locale::message_format<char>;
-
-// A locale with the messages of one catalogue, or with none when there is no such catalogue. The facet is made directly and not
-// by a generator: a generator goes from "de_DE" to "de" by itself, while the order of languages is decided here.
-std::locale loadCatalogue(const std::filesystem::path& folder, const std::string& catalogue, const std::string& table) {
-  boost::locale::gnu_gettext::messages_info info;
-  info.language = catalogue;
-  info.encoding = "UTF-8";
-  info.domains.emplace_back(table);
-  info.paths.push_back(folder.string());
-  info.callback = [](const std::string& file, const std::string&) { return readCatalogue(file); };
-  return std::locale(std::locale::classic(), boost::locale::gnu_gettext::create_messages_facet<char>(info));
-}
-
-// The empty key is a catalogue's own header, and a zero byte would cut a key short or name another file.
+// The empty key is a catalogue's own header, and a zero byte would name another file.
 bool canBeLookedUp(std::string_view key, std::string_view table) {
-  return !key.empty() && key.find('\0') == std::string_view::npos && !table.empty() &&
-         table.find_first_of(std::string_view("/\0", 2)) == std::string_view::npos;
+  return !key.empty() && !table.empty() && table.find_first_of(std::string_view("/\0", 2)) == std::string_view::npos;
 }
 
 }  // namespace
 
-/// The catalogues that have been asked for, each loaded once.
+/// The catalogues that have been asked for, each read once.
 class GettextStringTable::Catalogues {
  public:
   explicit Catalogues(std::filesystem::path folder) : _folder(std::move(folder)) {}
 
-  std::locale find(const std::string& catalogue, const std::string& table) {
+  /// Lives as long as this object.
+  const CatalogueTexts& find(const std::string& catalogue, std::string_view table) {
     const std::lock_guard guard(_mutex);
-    auto& loaded = _loaded[table];
-    auto position = loaded.find(catalogue);
-    if (position == loaded.end()) position = loaded.emplace(catalogue, load(catalogue, table)).first;
+    auto ofTable = _read.find(table);
+    if (ofTable == _read.end()) ofTable = _read.emplace(table, std::map<std::string, CatalogueTexts>()).first;
+    auto position = ofTable->second.find(catalogue);
+    if (position == ofTable->second.end()) {
+      const std::filesystem::path file = _folder / catalogue / "LC_MESSAGES" / (std::string(table) + ".mo");
+      position = ofTable->second.emplace(catalogue, readCatalogue(file)).first;
+    }
     return position->second;
   }
 
  private:
-  std::locale load(const std::string& catalogue, const std::string& table) const {
-    try {
-      return loadCatalogue(_folder, catalogue, table);
-    } catch (const std::exception&) {
-      return std::locale::classic();
-    }
-  }
-
   const std::filesystem::path _folder;
   std::mutex _mutex;
-  std::map<std::string, std::map<std::string, std::locale>> _loaded;  // guarded by _mutex; by table, then by catalogue
+  std::map<std::string, std::map<std::string, CatalogueTexts>, std::less<>> _read;  // guarded by _mutex; by table, catalogue
 };
 
 GettextStringTable::GettextStringTable(std::filesystem::path resourcesFolder, std::optional<std::string> fixedLanguage)
@@ -71,13 +50,10 @@ GettextStringTable::~GettextStringTable() = default;
 std::string GettextStringTable::localizedString(std::string_view key, std::string_view defaultValue,
                                                 std::string_view tableName) const {
   if (canBeLookedUp(key, tableName)) {
-    const std::string id(key);
-    const std::string table(tableName);
     for (const std::string& catalogue : preferredCatalogues(_fixedLanguage)) {
-      const std::locale locale = _catalogues->find(catalogue, table);
-      if (!std::has_facet<Messages>(locale)) continue;
-      const char* text = std::use_facet<Messages>(locale).get(0, nullptr, id.c_str());
-      if (text != nullptr && *text != '\0') return text;
+      const CatalogueTexts& texts = _catalogues->find(catalogue, tableName);
+      const auto text = texts.find(key);
+      if (text != texts.end() && !text->second.empty()) return text->second;
     }
   }
   return std::string(defaultValue);

@@ -4,22 +4,29 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <fstream>
+#include <iterator>
 #include <random>
 #include <string>
 
 #include "Tests/Host/CatalogueBytes.h"
 
 using namespace palisade;
+using testing::Contains;
+using testing::ElementsAre;
 using testing::IsEmpty;
+using testing::Key;
 using testing::Not;
+using testing::Optional;
+using testing::Pair;
 
 namespace {
 
 std::filesystem::path compiledCatalogue() { return std::filesystem::path(LANGUAGES_FOLDER) / "de/LC_MESSAGES/Localizable.mo"; }
 
 std::string compiledBytes() {
-  const std::vector<char> bytes = readCatalogue(compiledCatalogue());
-  return {bytes.begin(), bytes.end()};
+  std::ifstream file(compiledCatalogue(), std::ios::binary);
+  return {std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
 }
 
 std::string withWord(std::string bytes, std::size_t offset, std::uint32_t word) {
@@ -27,7 +34,7 @@ std::string withWord(std::string bytes, std::size_t offset, std::uint32_t word) 
   return bytes;
 }
 
-// As a machine of the other byte order would have written the catalogue. The hash table, if any, is not reversed.
+// As a machine of the other byte order would have written the catalogue.
 std::string withReversedWords(std::string bytes, std::size_t words) {
   for (std::size_t word = 0; word < words; ++word) {
     std::swap(bytes[4 * word], bytes[4 * word + 3]);
@@ -38,22 +45,41 @@ std::string withReversedWords(std::string bytes, std::size_t words) {
 
 }  // namespace
 
-TEST(ACompiledCatalogue, IsWellFormed) {
-  EXPECT_TRUE(isWellFormedCatalogue(compiledBytes()));
-  EXPECT_TRUE(isWellFormedCatalogue(catalogueBytes({})));
-  EXPECT_TRUE(isWellFormedCatalogue(catalogueBytes({{"KEY", ""}})));
+TEST(ACompiledCatalogue, HoldsItsTexts) {
+  EXPECT_THAT(catalogueTexts(catalogueBytes({})), Optional(ElementsAre(Key(""))));
+  EXPECT_THAT(catalogueTexts(catalogueBytes({{"KEY", ""}, {"OTHER", "Ä"}})),
+              Optional(ElementsAre(Key(""), Pair("KEY", ""), Pair("OTHER", "Ä"))));
+  EXPECT_THAT(catalogueTexts(compiledBytes()), Optional(Contains(Pair("FAREWELL", "Auf Wiedersehen"))));
 }
 
 TEST(ACompiledCatalogue, MayBeOfEitherByteOrder) {
   const std::string bytes = catalogueBytes({{"KEY", "text"}});
-  EXPECT_TRUE(isWellFormedCatalogue(withReversedWords(bytes, 7 + 8)));
+  EXPECT_EQ(catalogueTexts(withReversedWords(bytes, 7 + 8)), catalogueTexts(bytes));
+}
+
+TEST(ACompiledCatalogue, GivesTheFirstOfSeveralNumbers) {
+  const std::string several("KEY\0KEYS", 8);
+  EXPECT_THAT(catalogueTexts(catalogueBytes({{several, std::string("one\0many", 8)}})), Optional(Contains(Pair("KEY", "one"))));
+}
+
+TEST(ACompiledCatalogue, MustBeInUtf8) {
+  const struct {
+    const char* header;
+    bool isTaken;
+  } cases[] = {{"Content-Type: text/plain; charset=UTF-8\n", true},
+               {"Content-Type: text/plain; charset=utf-8\n", true},
+               {"Content-Type: text/plain; charset=ISO-8859-1\n", false},
+               {"", false}};
+  for (const auto& [header, isTaken] : cases) {
+    EXPECT_EQ(catalogueTexts(catalogueBytes({{"", header}})).has_value(), isTaken) << header;
+  }
 }
 
 TEST(ACatalogueThatWasCutOff, IsRefusedAtEveryLength) {
   const std::string bytes = compiledBytes();
   ASSERT_THAT(bytes, Not(IsEmpty()));
   for (std::size_t length = 0; length < bytes.size(); ++length) {
-    EXPECT_FALSE(isWellFormedCatalogue(bytes.substr(0, length))) << length;
+    EXPECT_FALSE(catalogueTexts(bytes.substr(0, length))) << length;
   }
 }
 
@@ -64,24 +90,19 @@ TEST(ACatalogueWithAFalseHeader, IsRefused) {
     std::size_t offset;
     std::uint32_t word;
   } cases[] = {
-      {"magic number", 0, 0x12345678},     {"count", 8, 1000},
-      {"largest count", 8, 0xFFFFFFFF},    {"key table", 12, 10'000},
-      {"text table", 16, 0xFFFFFFFC},      {"size of the hash table", 20, 1000},
-      {"length of the key", 36, 100},      {"greatest length of the key", 36, 0xFFFFFFFF},
-      {"place of the key", 40, 0x7FFFFFF}, {"a key without an end", 36, 2},
+      {"magic number", 0, 0x12345678},
+      {"count", 8, 1000},
+      {"largest count", 8, 0xFFFFFFFF},
+      {"key table", 12, 10'000},
+      {"text table", 16, 0xFFFFFFFC},
+      {"length of the key", 36, 100},
+      {"greatest length of the key", 36, 0xFFFFFFFF},
+      {"place of the key", 40, 0x7FFFFFF},
+      {"a key without an end", 36, 2},
   };
   for (const auto& [what, offset, word] : cases) {
-    EXPECT_FALSE(isWellFormedCatalogue(withWord(bytes, offset, word))) << what;
+    EXPECT_FALSE(catalogueTexts(withWord(bytes, offset, word))) << what;
   }
-}
-
-TEST(ACatalogueWhoseHashTableNamesNoText, IsRefused) {
-  const std::string bytes = compiledBytes();
-  std::uint32_t hashTable = 0;
-  for (std::size_t index = 0; index < 4; ++index) {
-    hashTable |= std::uint32_t{static_cast<unsigned char>(bytes[24 + index])} << (8 * index);
-  }
-  EXPECT_FALSE(isWellFormedCatalogue(withWord(bytes, hashTable, 1000)));
 }
 
 TEST(ACatalogueFile, IsEmptyUnlessItIsAWellFormedFile) {
