@@ -66,24 +66,6 @@ void requireGrant(std::uint32_t response) {
   if (response != granted) throw BusCallError("The request was answered with " + std::to_string(response) + ".");
 }
 
-struct Outcomes {
-  std::string request;
-  std::optional<std::uint32_t> response;
-};
-
-int rememberResponse(sd_bus_message* message, void* place, sd_bus_error*) {
-  auto& outcomes = *static_cast<Outcomes*>(place);
-  std::uint32_t response = 0;
-  if (sd_bus_message_read(message, "u", &response) >= 0) {
-    outcomes = {.request = sd_bus_message_get_path(message), .response = response};
-  }
-  return 0;
-}
-
-struct ReleaseSlot {
-  void operator()(sd_bus_slot* slot) const { sd_bus_slot_unref(slot); }
-};
-
 }  // namespace
 
 void callEcho(sd_bus& bus) {
@@ -94,19 +76,31 @@ void callEcho(sd_bus& bus) {
 
 void requestGrantedAccess(sd_bus& bus) { requireGrant(requestAccess(bus).response); }
 
-void requestAccessAndWait(sd_bus& bus) {
-  Outcomes outcomes;
+WaitingApplication::WaitingApplication(sd_bus& bus) : _bus(bus) {
   sd_bus_slot* slot = nullptr;
-  requireSuccess(sd_bus_match_signal(&bus, &slot, accounts, nullptr, request, "Response", rememberResponse, &outcomes),
+  requireSuccess(sd_bus_match_signal(&bus, &slot, accounts, nullptr, request, "Response", rememberOutcome, &_outcome),
                  "The Response signal cannot be waited for");
-  const std::unique_ptr<sd_bus_slot, ReleaseSlot> match(slot);
-  const Reply reply = requestAccess(bus);
-  if (reply.response != pending) return requireGrant(reply.response);
-  while (outcomes.request != reply.request) {
-    if (requireSuccess(sd_bus_process(&bus, nullptr), "The bus went away") == 0) sd_bus_wait(&bus, UINT64_MAX);
-  }
-  requireGrant(*outcomes.response);
+  _match.reset(slot);
 }
+
+void WaitingApplication::requestAccess() {
+  const Reply reply = palisade::requestAccess(_bus);
+  if (reply.response != pending) return requireGrant(reply.response);
+  while (_outcome.request != reply.request) {
+    if (requireSuccess(sd_bus_process(&_bus, nullptr), "The bus went away") == 0) sd_bus_wait(&_bus, UINT64_MAX);
+  }
+  requireGrant(_outcome.response);
+}
+
+int WaitingApplication::rememberOutcome(sd_bus_message* message, void* outcome, sd_bus_error*) {
+  std::uint32_t response = 0;
+  if (sd_bus_message_read(message, "u", &response) >= 0) {
+    *static_cast<Outcome*>(outcome) = {.request = sd_bus_message_get_path(message), .response = response};
+  }
+  return 0;
+}
+
+void WaitingApplication::ReleaseSlot::operator()(sd_bus_slot* slot) const { sd_bus_slot_unref(slot); }
 
 void readCredential(sd_bus& bus) {
   const Message call = newCall(bus, accounts, accountsPath, manager, "GetCredential");

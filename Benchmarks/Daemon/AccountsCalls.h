@@ -5,6 +5,12 @@
 /// Threads: any, each with a bus connection of its own. Errors: `BusCallError`, also for an answer that is not the one that the
 /// measurement is about.
 
+#include <systemd/sd-bus.h>
+
+#include <cstdint>
+#include <memory>
+#include <string>
+
 #include "Benchmarks/Daemon/BusLoad.h"
 
 namespace palisade {
@@ -15,8 +21,29 @@ void callEcho(sd_bus& bus);
 /// A request that an earlier grant answers.
 void requestGrantedAccess(sd_bus& bus);
 
-/// A request that somebody has to be asked about; returns when the outcome is known, and that has to be a grant.
-void requestAccessAndWait(sd_bus& bus);
+/// An application that listens for the outcomes of its requests.
+class WaitingApplication {
+ public:
+  explicit WaitingApplication(sd_bus& bus);
+
+  /// A request that somebody has to be asked about; returns when the outcome is known, and that has to be a grant.
+  void requestAccess();
+
+ private:
+  struct Outcome {
+    std::string request;
+    std::uint32_t response = 0;
+  };
+  struct ReleaseSlot {
+    void operator()(sd_bus_slot* slot) const;
+  };
+
+  static int rememberOutcome(sd_bus_message* message, void* outcome, sd_bus_error*);
+
+  sd_bus& _bus;
+  Outcome _outcome;
+  std::unique_ptr<sd_bus_slot, ReleaseSlot> _match;
+};
 
 void readCredential(sd_bus& bus);
 

@@ -11,6 +11,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <thread>
 #include <vector>
 
 #include "Benchmarks/Daemon/AccountsCalls.h"
@@ -19,6 +20,7 @@
 #include "Host/Accounts/AccountStoreSchema.h"
 #include "Host/Sqlite/Database.h"
 #include "Host/Sqlite/Transaction.h"
+#include "Host/Vantad/Outbox.h"
 
 namespace palisade {
 namespace {
@@ -142,11 +144,13 @@ void measureStart() {
   std::fflush(stdout);
 }
 
+std::filesystem::path stateFile(const char* name) {
+  return std::filesystem::path(std::getenv("XDG_STATE_HOME")) / "palisade" / name;
+}
+
 void fillStore(int grants) {
-  const auto database =
-      Database::open({.path = std::filesystem::path(std::getenv("XDG_STATE_HOME")) / "palisade/accounts.sqlite",
-                      .applicationID = accountStoreApplicationID,
-                      .migrations = accountStoreMigrations});
+  const auto database = Database::open(
+      {.path = stateFile("accounts.sqlite"), .applicationID = accountStoreApplicationID, .migrations = accountStoreMigrations});
   Transaction transaction(*database);
   const std::string sql =
       "WITH RECURSIVE numbers (number) AS (SELECT 1 UNION ALL SELECT number + 1 FROM numbers WHERE number < " +
@@ -181,16 +185,25 @@ void measureManyGrants() {
   std::fflush(stdout);
 }
 
+// Until the social daemon and the server have done with the revoked token, and are there for the next one alone.
+void waitForInvalidations(Outbox& outbox) {
+  constexpr std::chrono::milliseconds pause(2);
+  while (!outbox.pending().empty()) std::this_thread::sleep_for(pause);
+}
+
 // The alert is answered by the daemon itself, which is a program of the benchmarks; everything else is the product's.
 void measureApproval() {
   const MeasuredDaemon daemon(answeringDaemonProgram);
   const Bus bus = openBus();
+  Outbox outbox({.path = stateFile("outbox.sqlite")});
+  WaitingApplication application(*bus);
   std::vector<double> approvals;
   std::vector<double> echoes;
   for (int round = 0; round < 50; ++round) {
     revokeEverything(*bus);
+    waitForInvalidations(outbox);
     auto start = Clock::now();
-    requestAccessAndWait(*bus);
+    application.requestAccess();
     approvals.push_back(std::chrono::duration<double, std::micro>(Clock::now() - start).count());
     start = Clock::now();
     callEcho(*bus);
@@ -214,7 +227,7 @@ constexpr Part parts[] = {
 
 void obtainGrant() {
   const Bus bus = openBus();
-  requestAccessAndWait(*bus);
+  WaitingApplication(*bus).requestAccess();
   stopDaemon(processOwning(*bus, "com.veltran.Accounts1"));
 }
 
