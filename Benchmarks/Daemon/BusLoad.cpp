@@ -6,10 +6,10 @@
 #include <algorithm>
 #include <atomic>
 #include <cstring>
+#include <ctime>
 #include <exception>
 #include <fstream>
 #include <mutex>
-#include <sstream>
 #include <thread>
 #include <vector>
 
@@ -18,18 +18,14 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 
-// Processor time, user's and kernel's, as proc(5) counts it.
+// The processor time that all of a process's threads have used. proc(5) would count in hundredths of a second, and whole ticks.
 double processorMicroseconds(pid_t process) {
-  std::ifstream file("/proc/" + std::to_string(process) + "/stat");
-  std::string line;
-  std::getline(file, line);
-  std::istringstream fields(line.substr(line.rfind(')') + 2));
-  std::string ignored;
-  for (int field = 0; field < 11; ++field) fields >> ignored;
-  double user = 0;
-  double kernel = 0;
-  fields >> user >> kernel;
-  return (user + kernel) * 1e6 / static_cast<double>(sysconf(_SC_CLK_TCK));
+  clockid_t clock{};
+  timespec used{};
+  if (clock_getcpuclockid(process, &clock) != 0 || clock_gettime(clock, &used) != 0) {
+    throw std::runtime_error("The processor time of process " + std::to_string(process) + " cannot be read.");
+  }
+  return static_cast<double>(used.tv_sec) * 1e6 + static_cast<double>(used.tv_nsec) / 1e3;
 }
 
 struct Timings {
