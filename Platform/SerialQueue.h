@@ -1,10 +1,11 @@
 #pragma once
 
-/// Serial queues: work handed to one queue runs one piece at a time, in the order of arrival, on a thread of the queue's own.
+/// Serial queues: work handed to one queue runs one piece at a time, in the order of arrival.
 ///
-/// Threads: both operations may be called from any thread except, for `sync`, from the queue itself.
-/// Ownership: a queue runs what it was given before it is destroyed. Errors: an exception that leaves synchronous work reaches
-/// the caller of `sync`; asynchronous work must not throw.
+/// Threads: asynchronous work runs on a thread of the queue's own, synchronous work there or on the caller's. Both operations
+/// may be called from any thread except, for `sync`, from the queue itself. Ownership: a queue runs what it was given before it
+/// is destroyed. Errors: an exception that leaves synchronous work reaches the caller of `sync`; asynchronous work must not
+/// throw.
 
 #include <functional>
 #include <memory>

@@ -2,8 +2,9 @@
 
 /// Serial queues with a thread each. See `SerialQueue`.
 ///
-/// Threads: the queue's thread starts with its first work, so a queue that is never used costs none; it is named after the
-/// label's last element. Ownership: destroying a queue runs what it was given and ends its thread. Errors: none of its own.
+/// Threads: asynchronous work runs on the queue's thread, which starts with the first of it and is named after the label's last
+/// element. Synchronous work that finds nothing before it runs on the caller's thread, which would only wait meanwhile.
+/// Ownership: destroying a queue runs what it was given and ends its thread. Errors: none of its own.
 
 #include <condition_variable>
 #include <deque>
@@ -28,11 +29,13 @@ class ThreadSerialQueue final : public SerialQueue {
 
  private:
   void run();
+  bool runAtOnce(const std::function<void()>& work);
 
   const std::string _label;
   std::mutex _mutex;
-  std::condition_variable _hasWork;
+  std::condition_variable _changed;
   std::deque<std::function<void()>> _work;
+  bool _isRunning = false;
   bool _isEnding = false;
   std::thread _thread;
 };

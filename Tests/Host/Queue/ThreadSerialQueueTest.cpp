@@ -63,14 +63,35 @@ TEST(ASerialQueue, RunsOnePieceAtATimeWhoeverHandsItIn) {
   EXPECT_EQ(finished, callers * (pieces + 1));
 }
 
-TEST(ASerialQueue, WorksOnOneThreadOfItsOwn) {
+std::thread::id threadOfAsynchronousWork(ThreadSerialQueue& queue) {
+  std::promise<std::thread::id> thread;
+  queue.async([&] { thread.set_value(std::this_thread::get_id()); });
+  return thread.get_future().get();
+}
+
+TEST(ASerialQueue, RunsAsynchronousWorkOnOneThreadOfItsOwn) {
   ThreadSerialQueue queue(label);
-  std::thread::id first;
-  std::thread::id second;
-  queue.sync([&] { first = std::this_thread::get_id(); });
-  queue.sync([&] { second = std::this_thread::get_id(); });
-  EXPECT_EQ(first, second);
+  const std::thread::id first = threadOfAsynchronousWork(queue);
+  EXPECT_EQ(threadOfAsynchronousWork(queue), first);
   EXPECT_NE(first, std::this_thread::get_id());
+}
+
+TEST(ASerialQueue, RunsSynchronousWorkOnTheCallersThreadWhenNothingIsBeforeIt) {
+  ThreadSerialQueue queue(label);
+  std::thread::id thread;
+  queue.sync([&] { thread = std::this_thread::get_id(); });
+  EXPECT_EQ(thread, std::this_thread::get_id());
+}
+
+TEST(ASerialQueue, RunsAsynchronousWorkAfterTheSynchronousWorkThatItCameDuring) {
+  ThreadSerialQueue queue(label);
+  std::vector<std::string> seen;
+  queue.sync([&] {
+    queue.async([&] { seen.emplace_back("asynchronous"); });
+    seen.emplace_back("synchronous");
+  });
+  queue.sync([] {});
+  EXPECT_THAT(seen, testing::ElementsAre("synchronous", "asynchronous"));
 }
 
 TEST(ASerialQueue, DoesNotHoldUpAnotherQueue) {
@@ -136,11 +157,11 @@ TEST(ASerialQueue, NamesItsThreadAfterTheLastElementOfItsLabel) {
   for (const auto& [name, expected] : std::vector<Case>{{"com.example.palisade.work", "work"},
                                                         {"work", "work"},
                                                         {"com.example.aNameOfTooManyCharacters", "aNameOfTooManyC"}}) {
-    std::string seen;
+    std::promise<std::string> seen;
     ThreadSerialQueueFactory factory;
     const std::shared_ptr<SerialQueue> queue = factory.makeSerialQueue(name);
-    queue->sync([&] { seen = nameOfThisThread(); });
-    EXPECT_EQ(seen, expected);
+    queue->async([&] { seen.set_value(nameOfThisThread()); });
+    EXPECT_EQ(seen.get_future().get(), expected);
     EXPECT_EQ(queue->label(), name);
   }
 }
