@@ -13,7 +13,7 @@
 #include <optional>
 #include <string>
 
-#include "Host/Identity/FileDescriptor.h"
+#include "Host/Files/FileDescriptor.h"
 
 namespace palisade {
 

@@ -9,7 +9,7 @@
 #include <cstring>
 #include <string>
 
-#include "Host/Identity/FileDescriptor.h"
+#include "Host/Files/FileDescriptor.h"
 
 namespace palisade {
 namespace {

@@ -15,7 +15,7 @@
 #include <utility>
 
 #include "Host/Alert/TerminalDialog.h"
-#include "Host/Identity/FileDescriptor.h"
+#include "Host/Files/FileDescriptor.h"
 
 namespace palisade {
 namespace {

@@ -9,7 +9,7 @@
 #include <set>
 #include <system_error>
 
-#include "Host/Identity/FileDescriptor.h"
+#include "Host/Files/FileDescriptor.h"
 #include "Host/Preferences/TomlFile.h"
 
 // Whoever can write a record that counts can give away entitlements. So the folder and the file are opened first, who owns them

@@ -6,7 +6,7 @@
 #include <cstddef>
 #include <cstdlib>
 
-#include "Host/Identity/FileDescriptor.h"
+#include "Host/Files/FileDescriptor.h"
 #include "Host/Identity/KeyFile.h"
 
 namespace palisade {

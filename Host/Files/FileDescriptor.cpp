@@ -1,4 +1,4 @@
-#include "Host/Identity/FileDescriptor.h"
+#include "Host/Files/FileDescriptor.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
