@@ -38,6 +38,7 @@ namespace {
 
 constexpr const char* startOperation = "start";
 constexpr std::size_t listedRevocations = 1000;
+constexpr std::chrono::seconds patienceWithAnother{5};
 
 Date now() { return std::chrono::floor<std::chrono::seconds>(std::chrono::system_clock::now()); }
 
@@ -120,7 +121,7 @@ struct AccountDaemon::Parts {
                  .status = [this] { return status(); }}),
         pluginKeychain(*keychain, store, [this](const std::string& clientID) { return service.operationOf(clientID); }),
         bus(service) {
-    lock.emplace(stateFolder());
+    lock.emplace(stateFolder(), "accountd", patienceWithAnother);
     // Only the one daemon of these stores may repair: another could be in the middle of a grant.
     for (const std::string& sentence : repairAfterCrash(store, *keychain, outbox)) tell(sentence);
     if (!outbox.pending().empty()) bus.start(socialDaemonBusName);

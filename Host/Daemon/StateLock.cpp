@@ -6,7 +6,6 @@
 
 #include <cerrno>
 #include <cstring>
-#include <stdexcept>
 #include <thread>
 
 namespace palisade {
@@ -30,16 +29,16 @@ void makeFolder(const std::filesystem::path& folder) {
 
 }  // namespace
 
-StateLock::StateLock(const std::filesystem::path& stateFolder, std::chrono::milliseconds patience)
-    : _file((makeFolder(stateFolder), openFile(stateFolder / "accountd.lock"))) {
+StateLock::StateLock(const std::filesystem::path& stateFolder, const std::string& daemon, std::chrono::milliseconds patience)
+    : _file((makeFolder(stateFolder), openFile(stateFolder / (daemon + ".lock")))) {
   const auto end = std::chrono::steady_clock::now() + patience;
   while (flock(_file.number(), LOCK_EX | LOCK_NB) != 0) {
     if (errno != EWOULDBLOCK && errno != EINTR) {
       throw std::runtime_error(stateFolder.string() + " cannot be locked: " + std::strerror(errno) + ".");
     }
     if (std::chrono::steady_clock::now() > end) {
-      throw std::runtime_error("Another account daemon of this user, on another session bus, works on " + stateFolder.string() +
-                               ". End that session, or start this one with another XDG_STATE_HOME.");
+      throw StateIsTaken("Another " + daemon + " of this user, of another session perhaps, works on " + stateFolder.string() +
+                         ". End that one, or start this one with another XDG_STATE_HOME.");
     }
     std::this_thread::sleep_for(pause);
   }

@@ -22,6 +22,7 @@ namespace {
 
 constexpr auto settledAreShown = std::chrono::hours(24 * 90);
 constexpr auto afterAFailure = std::chrono::minutes(1);
+constexpr std::chrono::milliseconds noPatience(0);
 
 // The signals are read from a descriptor, so no thread may have them delivered.
 int openSignals() {
@@ -44,7 +45,7 @@ Vantad::Vantad(const VantadOptions& options, Log& log)
     : _options(options),
       _log(log),
       _outbox({.path = _options.outbox()}),
-      _instance(_options.lock()),
+      _lock(_options.state, "vantad", noPatience),
       _bus(socialDaemonBusName),
       _bell(Outbox::bellOf(_options.outbox())),
       _configurationFile(_options.configuration),

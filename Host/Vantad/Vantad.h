@@ -9,6 +9,7 @@
 #include <optional>
 
 #include "Host/Bus/BusPresence.h"
+#include "Host/Daemon/StateLock.h"
 #include "Host/Http/HttpClient.h"
 #include "Host/Json/Json.h"
 #include "Host/Social/FacebookServer.h"
@@ -17,7 +18,6 @@
 #include "Host/Vantad/FileWatch.h"
 #include "Host/Vantad/NetworkWatch.h"
 #include "Host/Vantad/Outbox.h"
-#include "Host/Vantad/SingleInstance.h"
 #include "Host/Vantad/VantadOptions.h"
 
 namespace palisade {
@@ -42,7 +42,7 @@ class Vantad {
   const VantadOptions _options;
   Log& _log;
   Outbox _outbox;
-  SingleInstance _instance;
+  StateLock _lock;
   BusPresence _bus;
   FileWatch _bell;
   FileWatch _configurationFile;

@@ -30,7 +30,6 @@ struct VantadOptions {
   void takeDefaultsFrom(const Dictionary& accountdTable);
 
   std::filesystem::path outbox() const { return state / "outbox.sqlite"; }
-  std::filesystem::path lock() const { return state / "vantad.lock"; }
   KeychainOptions keychainOptions() const;
 };
 

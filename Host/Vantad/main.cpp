@@ -39,8 +39,8 @@ int main(int count, char** words) {
   try {
     run(parseVantadOptions(count, words));
     return EXIT_SUCCESS;
-  } catch (const AlreadyRunning& error) {
-    std::fprintf(stderr, "vantad: %s It runs already.\n", error.what());
+  } catch (const StateIsTaken& error) {
+    std::fprintf(stderr, "vantad: %s\n", error.what());
     return notNeeded;
   } catch (const std::invalid_argument& error) {
     std::fprintf(stderr, "vantad: %s Try vantad --help.\n", error.what());

@@ -26,6 +26,7 @@ using testing::AllOf;
 using testing::HasSubstr;
 using testing::ThrowsMessage;
 
+constexpr const char* accountDaemon = "accountd";
 constexpr std::chrono::milliseconds noPatience{0};
 constexpr std::chrono::minutes muchPatience{5};
 
@@ -62,7 +63,7 @@ class OtherDaemon {
   // Never throws, lest the child go on with the tests.
   [[noreturn]] void holdLock(const std::filesystem::path& folder) noexcept {
     close(_ending[1]);
-    const StateLock lock(folder);
+    const StateLock lock(folder, accountDaemon, muchPatience);
     if (write(_ready[1], "r", 1) != 1) _exit(1);
     char byte = 0;
     // Ends with the last writer, so also when the test fails.
@@ -83,7 +84,7 @@ class State : public testing::Test {
 };
 
 TEST_F(State, GetsAFolderForItsOwnerAlone) {
-  const StateLock lock(folder, noPatience);
+  const StateLock lock(folder, accountDaemon, noPatience);
   struct stat status {};
   ASSERT_EQ(stat(folder.c_str(), &status), 0);
   EXPECT_EQ(status.st_mode & 0777U, 0700U);
@@ -91,9 +92,14 @@ TEST_F(State, GetsAFolderForItsOwnerAlone) {
 
 TEST_F(State, IsRefusedWhileAnotherDaemonWorksOnIt) {
   const OtherDaemon other(folder);
-  EXPECT_THAT([&] { StateLock(folder, noPatience); },
-              ThrowsMessage<std::runtime_error>(
-                  AllOf(HasSubstr(folder.string()), HasSubstr("End that session"), HasSubstr("XDG_STATE_HOME"))));
+  EXPECT_THAT(
+      [&] { StateLock(folder, accountDaemon, noPatience); },
+      ThrowsMessage<StateIsTaken>(AllOf(HasSubstr(folder.string()), HasSubstr("End that one"), HasSubstr("XDG_STATE_HOME"))));
+}
+
+TEST_F(State, IsForOneDaemonOfEachKind) {
+  const OtherDaemon other(folder);
+  EXPECT_NO_THROW(StateLock(folder, "vantad", noPatience));
 }
 
 TEST_F(State, IsWaitedForUntilTheOtherDaemonHasEnded) {
@@ -104,7 +110,7 @@ TEST_F(State, IsWaitedForUntilTheOtherDaemonHasEnded) {
     // Has to be without its parent's end of the pipe: the other daemon ends with the last of them.
     other->end();
     try {
-      const StateLock lock(folder, muchPatience);
+      const StateLock lock(folder, accountDaemon, muchPatience);
       _exit(0);
     } catch (const std::runtime_error&) {
       _exit(1);
@@ -120,17 +126,17 @@ TEST_F(State, IsWaitedForUntilTheOtherDaemonHasEnded) {
 TEST_F(State, IsFreeAgainWhenItsDaemonIsKilled) {
   const OtherDaemon other(folder);
   other.killHard();
-  EXPECT_NO_THROW(StateLock(folder, muchPatience));
+  EXPECT_NO_THROW(StateLock(folder, accountDaemon, muchPatience));
 }
 
 TEST_F(State, IsFreeAgainWhenTheLockIsGone) {
-  { const StateLock lock(folder, noPatience); }
-  EXPECT_NO_THROW(StateLock(folder, noPatience));
+  { const StateLock lock(folder, accountDaemon, noPatience); }
+  EXPECT_NO_THROW(StateLock(folder, accountDaemon, noPatience));
 }
 
 TEST_F(State, OfAnotherFolderIsNotInTheWay) {
   const OtherDaemon other(folder);
-  EXPECT_NO_THROW(StateLock(temporary.path() / "another", noPatience));
+  EXPECT_NO_THROW(StateLock(temporary.path() / "another", accountDaemon, noPatience));
 }
 
 TEST_F(State, IsRefusedWhenItsLockIsALink) {
@@ -138,14 +144,14 @@ TEST_F(State, IsRefusedWhenItsLockIsALink) {
   const std::filesystem::path target = temporary.path() / "target";
   std::filesystem::create_symlink(target, folder / "accountd.lock");
   EXPECT_THAT(
-      [&] { StateLock(folder, noPatience); },
+      [&] { StateLock(folder, accountDaemon, noPatience); },
       ThrowsMessage<std::runtime_error>(AllOf(HasSubstr((folder / "accountd.lock").string()), HasSubstr("cannot be opened"))));
   EXPECT_FALSE(std::filesystem::exists(target));
 }
 
 TEST_F(State, IsRefusedWhereThereCanBeNoFolder) {
   std::ofstream(temporary.path() / "state") << "no folder";
-  EXPECT_THROW(StateLock(folder, noPatience), std::runtime_error);
+  EXPECT_THROW(StateLock(folder, accountDaemon, noPatience), std::runtime_error);
 }
 
 }  // namespace

@@ -152,7 +152,7 @@ TEST_F(Vantad, RunsOnceForAStateFolder) {
   ASSERT_TRUE(settlesEverything()) << contentOf(log());
   ChildProcess second(command());
   EXPECT_EQ(second.wait(), 1);
-  EXPECT_THAT(contentOf(log()), HasSubstr("It runs already."));
+  EXPECT_THAT(contentOf(log()), HasSubstr("Another vantad of this user"));
 }
 
 TEST_F(Vantad, StartsToWorkWhenAServerIsConfigured) {
