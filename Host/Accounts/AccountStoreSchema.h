@@ -14,7 +14,7 @@ inline constexpr std::int32_t accountStoreApplicationID = 0x506c4163;
 
 /// `position` and `id` count up and give the store's order. Options and permissions are JSON; NULL is none. `digest` tells a
 /// damaged record from a good one.
-inline constexpr std::array<std::string_view, 2> accountStoreMigrations{R"sql(
+inline constexpr std::array<std::string_view, 3> accountStoreMigrations{R"sql(
   CREATE TABLE accounts (
     position INTEGER PRIMARY KEY,
     id TEXT NOT NULL UNIQUE DEFAULT (lower(hex(randomblob(16)))),
@@ -60,6 +60,9 @@ inline constexpr std::array<std::string_view, 2> accountStoreMigrations{R"sql(
     app_id TEXT,
     PRIMARY KEY (account_type, client_id)
   ) STRICT, WITHOUT ROWID;
+)sql",
+                                                                        R"sql(
+  CREATE INDEX authorizations_of_bundle ON authorizations (bundle_id);
 )sql"};
 
 }  // namespace palisade

@@ -118,6 +118,13 @@ class SqliteAccountStore final : public AccountStore, public AuthorizationManage
   /// Every client's record for the account type, in the store's order.
   std::vector<StoredAuthorization> storedAuthorizations(std::string_view accountTypeIdentifier);
 
+  /// One client's record; none when there is none.
+  std::optional<StoredAuthorization> storedAuthorization(std::string_view accountTypeIdentifier, std::string_view clientID);
+
+  /// The records of all clients that had this bundle ID when they were stored.
+  std::vector<StoredAuthorization> storedAuthorizationsOfBundle(std::string_view accountTypeIdentifier,
+                                                                std::string_view bundleID);
+
   /// Stores a refusal that no user gave. It counts like any other until it is removed; a grant is not accepted.
   std::optional<Error> setAuthorizationAnsweredByNobody(const ClientAuthorization& refusal,
                                                         const std::shared_ptr<const Client>& forClient,
@@ -163,6 +170,8 @@ class SqliteAccountStore final : public AccountStore, public AuthorizationManage
   std::optional<Error> _writeUntold(Work work);
   std::optional<Error> _store(const ClientAuthorization& authorization, const std::shared_ptr<const Client>& client,
                               const AccountType& accountType, bool answeredByNobody);
+  template <typename Query>
+  std::vector<StoredAuthorization> _listed(std::string_view accountTypeIdentifier, const Query& query);
   std::shared_ptr<const Client> _clientOf(const AuthorizationRow& row) const;
   void _tell(const StoreChange& change) const;
 

@@ -82,10 +82,12 @@ std::optional<std::shared_ptr<const ClientAuthorization>> SqliteAccountStore::_r
   return record;
 }
 
-std::vector<StoredAuthorization> SqliteAccountStore::storedAuthorizations(std::string_view accountTypeIdentifier) {
+// `query` begins a run of one of the reader's statements.
+template <typename Query>
+std::vector<StoredAuthorization> SqliteAccountStore::_listed(std::string_view accountTypeIdentifier, const Query& query) {
   std::vector<ReadRow> rows = _connections->read([&](const AccountStoreReader& reader) {
     std::vector<ReadRow> read;
-    Statement::Run run = reader.authorizations.run(accountTypeIdentifier);
+    Statement::Run run = query(reader);
     while (run.next()) read.push_back(readRow(run, accountTypeIdentifier));
     return read;
   });
@@ -105,6 +107,26 @@ std::vector<StoredAuthorization> SqliteAccountStore::storedAuthorizations(std::s
                               .isDamaged = !isReadable});
   }
   return authorizations;
+}
+
+std::vector<StoredAuthorization> SqliteAccountStore::storedAuthorizations(std::string_view accountTypeIdentifier) {
+  return _listed(accountTypeIdentifier,
+                 [&](const AccountStoreReader& reader) { return reader.authorizations.run(accountTypeIdentifier); });
+}
+
+std::optional<StoredAuthorization> SqliteAccountStore::storedAuthorization(std::string_view accountTypeIdentifier,
+                                                                           std::string_view clientID) {
+  auto found = _listed(accountTypeIdentifier, [&](const AccountStoreReader& reader) {
+    return reader.authorization.run(accountTypeIdentifier, clientID);
+  });
+  return found.empty() ? std::nullopt : std::optional(std::move(found.front()));
+}
+
+std::vector<StoredAuthorization> SqliteAccountStore::storedAuthorizationsOfBundle(std::string_view accountTypeIdentifier,
+                                                                                  std::string_view bundleID) {
+  return _listed(accountTypeIdentifier, [&](const AccountStoreReader& reader) {
+    return reader.authorizationsOfBundle.run(accountTypeIdentifier, bundleID);
+  });
 }
 
 std::vector<std::shared_ptr<ClientAuthorization>> SqliteAccountStore::allAuthorizationsForAccountType(

@@ -65,6 +65,10 @@ struct AccountStoreReader {
         authorization(database, "read an authorization",
                       "SELECT client_id, bundle_id, app_name, granted, answered_by_nobody, options, permissions, updated_at,"
                       " digest FROM authorizations WHERE account_type = ?1 AND client_id = ?2"),
+        authorizationsOfBundle(
+            database, "read an application's authorizations",
+            "SELECT client_id, bundle_id, app_name, granted, answered_by_nobody, options, permissions, updated_at,"
+            " digest FROM authorizations WHERE account_type = ?1 AND bundle_id = ?2 ORDER BY position"),
         // Nearly all records are of one account type: reading the table in its own order beats the index and a sort.
         authorizations(database, "list the authorizations",
                        "SELECT client_id, bundle_id, app_name, granted, answered_by_nobody, options, permissions, updated_at,"
@@ -80,6 +84,7 @@ struct AccountStoreReader {
   Statement accounts;
   Statement accountsOfType;
   Statement authorization;
+  Statement authorizationsOfBundle;
   Statement authorizations;
   Statement intents;
   Statement history;

@@ -14,13 +14,13 @@
 namespace palisade {
 namespace {
 
-std::optional<std::string> appIDOf(const StoredAuthorization* stored) {
-  if (stored == nullptr || stored->record->options() == nullptr) return std::nullopt;
+std::optional<std::string> appIDOf(const std::optional<StoredAuthorization>& stored) {
+  if (!stored || stored->record->options() == nullptr) return std::nullopt;
   const Value* appID = stored->record->options()->find(FacebookAppIdKey);
   return appID == nullptr || appID->string() == nullptr ? std::nullopt : std::optional(*appID->string());
 }
 
-bool isGranted(const StoredAuthorization* stored) { return stored != nullptr && stored->record->isGranted(); }
+bool isGranted(const std::optional<StoredAuthorization>& stored) { return stored && stored->record->isGranted(); }
 
 void orThrow(const std::optional<Error>& error) {
   if (error) throw std::runtime_error(error->description.value_or("It was refused."));
@@ -62,14 +62,12 @@ class Repair {
   // A grant that was cut off is undone: nobody was told of it. A revocation is finished: somebody wanted it.
   void finish(const Intent& intent, const AccountRecord* account) {
     const AccountType accountType(intent.accountTypeIdentifier);
-    const auto records = _store.storedAuthorizations(intent.accountTypeIdentifier);
-    const auto found = std::ranges::find(records, intent.clientID, &StoredAuthorization::clientID);
-    const StoredAuthorization* stored = found == records.end() ? nullptr : &*found;
+    const auto stored = _store.storedAuthorization(intent.accountTypeIdentifier, intent.clientID);
     const bool isCutGrant = intent.kind == Intent::Kind::grant && !isGranted(stored);
     if (account != nullptr && (isCutGrant || intent.kind != Intent::Kind::grant)) {
       takeBackToken(*account, intent.clientID, intent.appID ? intent.appID : appIDOf(stored));
     }
-    if (intent.kind == Intent::Kind::revocation && stored != nullptr) {
+    if (intent.kind == Intent::Kind::revocation && stored) {
       stored->record->setIsGranted(false);
       stored->record->setGrantedPermissions(nullptr);
       orThrow(_store.setAuthorization(*stored->record, stored->record->client(), accountType));
@@ -83,17 +81,23 @@ class Repair {
   }
 
   void removeTokensWithoutGrant(const AccountRecord& account) {
-    const auto records = _store.storedAuthorizations(account.accountTypeIdentifier);
     for (const std::string& clientID : _keychain.clientIDsWithCredentials(objectOf(account))) {
-      const auto found = std::ranges::find_if(
-          records, [&](const StoredAuthorization& stored) { return stored.record->client()->bundleID() == clientID; });
-      const StoredAuthorization* stored = found == records.end() ? nullptr : &*found;
+      const auto stored = recordOfBundle(account.accountTypeIdentifier, clientID);
       if (isGranted(stored)) continue;
       attempt("The token of " + clientID + " has no grant and could not be removed: ", [&] {
         takeBackToken(account, clientID, appIDOf(stored));
         _report.push_back("The token of " + clientID + " had no grant and was removed.");
       });
     }
+  }
+
+  // A grant rather than another record. The bundle ID counts that a client has now: by that one its token is found.
+  std::optional<StoredAuthorization> recordOfBundle(const std::string& accountTypeIdentifier, const std::string& bundleID) {
+    std::optional<StoredAuthorization> found;
+    for (StoredAuthorization& stored : _store.storedAuthorizationsOfBundle(accountTypeIdentifier, bundleID)) {
+      if (stored.record->client()->bundleID() == bundleID && !isGranted(found)) found = std::move(stored);
+    }
+    return found;
   }
 
   // First the queue, then the keychain: a second crash in between repeats the harmless half.
