@@ -104,6 +104,7 @@ class AccountOperations final : public AccountsService {
   void manage(const std::string& accountType, const PluginCall& call);
   void withdraw(const Withdrawable& isMeant);
   std::string receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken);
+  std::shared_ptr<const AccountCredential> tokenOf(const AccountRecord& account);
 
   Parts _parts;
   ClientLanes _lanes;

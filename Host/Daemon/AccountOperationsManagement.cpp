@@ -82,19 +82,33 @@ std::string AccountOperations::addAccount(const BusCaller& caller, const std::st
   if (token.empty() || token.size() > longestToken) {
     throw BusFailure(BusFailureKind::invalidArguments, "An account needs a token of at most 64 KiB.");
   }
-  for (const AccountRecord& other : storeCall([&] { return _parts.store.accounts(); })) {
-    if (other.accountTypeIdentifier == accountType && other.username == username) {
-      throw BusFailure(BusFailureKind::invalidArguments, "There is an account '" + username + "' of this type already.");
-    }
+  const auto accounts = storeCall([&] { return _parts.store.accounts(); });
+  const auto found = std::ranges::find_if(accounts, [&](const AccountRecord& other) {
+    return other.accountTypeIdentifier == accountType && other.username == username;
+  });
+  // An account without a token is what an addition leaves that was cut off: this one brings it to its end.
+  const bool isNew = found == accounts.end();
+  if (!isNew && tokenOf(*found) != nullptr) {
+    throw BusFailure(BusFailureKind::invalidArguments, "There is an account '" + username + "' of this type already.");
   }
-  const AccountRecord record = storeCall([&] { return _parts.store.addAccount(accountType, username, username); });
+  const AccountRecord record =
+      isNew ? storeCall([&] { return _parts.store.addAccount(accountType, username, username); }) : *found;
   const auto account = std::make_shared<StoredAccount>(record.id, record.username, record.description);
   account->setCredential(std::make_shared<const AccountCredential>(std::move(token), "", distantFuture));
   if (const auto error = _parts.keychain.setCredentialForAccount(account, std::nullopt)) {
-    _parts.store.removeAccount(record.id);
+    if (isNew) _parts.store.removeAccount(record.id);
     throw BusFailure(BusFailureKind::keychainUnavailable, error->description.value_or("The keychain refused the token."));
   }
   return record.id;
+}
+
+std::shared_ptr<const AccountCredential> AccountOperations::tokenOf(const AccountRecord& account) {
+  try {
+    return _parts.keychain.credentialForAccount(
+        std::make_shared<StoredAccount>(account.id, account.username, account.description), std::nullopt);
+  } catch (const std::exception& failure) {
+    throw BusFailure(BusFailureKind::keychainUnavailable, failure.what());
+  }
 }
 
 // Each transfer holds a thread and two descriptors, so there are only so many: of a connection, and of all together.

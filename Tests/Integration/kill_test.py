@@ -259,5 +259,39 @@ class ADaemonThatIsKilled(unittest.TestCase):
         self.assertGreaterEqual(len(places), LEAST_POINTS)
 
 
+class AnAdditionOfAnAccountThatIsCutOff(unittest.TestCase):
+    def test_can_be_repeated_until_the_account_can_be_used(self):
+        points = 0
+        with trial.Trial(log="error") as session:
+            kill_points = KillPoints(session)
+            while True:
+                shutil.rmtree(session.state, ignore_errors=True)
+                kill_points.arm(0)
+                session.start_accountd(environment=kill_points.environment)
+                with session.caller() as caller:
+                    caller.grants()
+                    kill_points.arm(points + 1)
+                    try:
+                        caller.add_account("ada", session.master_token)
+                    except BusError as error:
+                        self.assertEqual(error.name, "NoReply")
+                call = kill_points.fatal_call()
+                if not call:
+                    break
+                points += 1
+                session.accountd.wait()
+                kill_points.arm(0)
+                session.start_accountd(environment=kill_points.environment)
+                with self.subTest(f"killed before call {points}, {call}"), session.caller() as caller:
+                    caller.listen()
+                    try:
+                        caller.add_account("ada", session.master_token)
+                    except BusError as error:
+                        self.assertIn("already", str(error))
+                    self.assertTrue(request(BASIC)(caller))
+                session.kill_accountd()
+        self.assertGreater(points, 10)
+
+
 if __name__ == "__main__":
     unittest.main(verbosity=2)
