@@ -51,13 +51,7 @@ void TomlPreferencesStore::synchronize(std::string_view domain) {
 
 void TomlPreferencesStore::set(std::string_view domain, std::string_view key, const std::optional<Value>& value) {
   const std::lock_guard lock(_mutex);
-  _domains.erase(std::string(domain));
-  Dictionary table;
-  for (const auto& [name, entry] : read(std::string(domain))) {
-    if (name != key) table.set(name, entry);
-  }
-  if (value) table.set(std::string(key), *value);
-  writeTomlFile(fileOf(domain), table);
+  setInTomlFile(fileOf(domain), std::string(key), value);
   _domains.erase(std::string(domain));
 }
 

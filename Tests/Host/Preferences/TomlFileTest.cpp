@@ -24,6 +24,10 @@ using testing::ThrowsMessage;
 class TomlFile : public testing::Test {
  protected:
   void write(const std::string& text) const { std::ofstream(path) << text; }
+  std::string content() const {
+    std::ifstream file(path);
+    return {std::istreambuf_iterator<char>(file), {}};
+  }
   std::vector<std::filesystem::path> filesInFolder() const {
     return {std::filesystem::directory_iterator(folder.path()), std::filesystem::directory_iterator()};
   }
@@ -88,6 +92,62 @@ TEST_F(TomlFile, ReadsWhatWasWritten) {
                          {"table", Dictionary{{"key with = and #", 1}}}};
   writeTomlFile(path, table);
   EXPECT_EQ(readTomlFile(path), table);
+}
+
+TEST_F(TomlFile, KeepsWhatIsWrittenAroundAValueThatIsSet) {
+  const struct {
+    const char* what;
+    const char* before;
+    std::optional<Value> value;
+    const char* after;
+  } cases[] = {
+      {"no file", "", 1, "size = 1\n"},
+      {"a comment alone", "# mine", 1, "# mine\nsize = 1\n"},
+      {"an old value", "# mine\nsize = 1  # in points\nfont = 'serif'\n", 22,
+       "# mine\nsize = 22  # in points\nfont = 'serif'\n"},
+      {"a value of several lines", "size = [1,  # one\n  2]\n# mine\n", 1, "size = 1\n# mine\n"},
+      {"letters of several bytes", "\"größe\" = 'ä' # ü\nsize = 'ö'#ü\n", 1, "\"größe\" = 'ä' # ü\nsize = 1#ü\n"},
+      {"a new value before tables", "a = 1 # mine\n\n# of the window\n[window]\nwidth = 3\n", 1,
+       "a = 1 # mine\nsize = 1\n\n# of the window\n[window]\nwidth = 3\n"},
+      {"a new value where there are tables only", "# of the window\n[window]\nwidth = 3\n", 1,
+       "size = 1\n# of the window\n[window]\nwidth = 3\n"},
+      {"a value that goes", "# mine\nsize = 1  # in points\nfont = 'serif'", std::nullopt, "# mine\nfont = 'serif'"},
+      {"a value that was not there", "# mine\n", std::nullopt, "# mine\n"},
+      {"another table's value of that name", "# mine\n[window]\nsize = 1\n", 2, "size = 2\n# mine\n[window]\nsize = 1\n"},
+      {"a date beside it", "size = 1\nday = 2026-11-22\n", 2, "size = 2\nday = 2026-11-22\n"},
+      {"an inline table", "size = { width = 3 } # mine\n", 1, "size = 1 # mine\n"},
+  };
+  for (const auto& [what, before, value, after] : cases) {
+    write(before);
+    setInTomlFile(path, "size", value);
+    EXPECT_EQ(content(), after) << what;
+  }
+}
+
+TEST_F(TomlFile, HoldsTheRightValuesWhereItsCommentsCannotBeKept) {
+  const struct {
+    const char* before;
+    std::optional<Value> value;
+    Dictionary after;
+  } cases[] = {
+      {"# mine\n[size]\nwidth = 3\n", 1, {{"size", 1}}},
+      {"[[size]]\nwidth = 3\n[[size]]\n", 1, {{"size", 1}}},
+      {"size.width = 3 # mine\nfont = 'serif'\n", std::nullopt, {{"font", "serif"}}},
+      {"font = 'serif' # mine\n[window]\n",
+       Dictionary{{"width", 3}},
+       {{"font", "serif"}, {"size", Dictionary{{"width", 3}}}, {"window", Dictionary()}}},
+  };
+  for (const auto& [before, value, after] : cases) {
+    write(before);
+    setInTomlFile(path, "size", value);
+    EXPECT_EQ(readTomlFile(path), after) << before;
+  }
+}
+
+TEST_F(TomlFile, ThatIsWrongIsNotWrittenOver) {
+  write("size = \n");
+  EXPECT_THROW(setInTomlFile(path, "size", 1), TomlError);
+  EXPECT_EQ(content(), "size = \n");
 }
 
 TEST_F(TomlFile, LeavesNullsOut) {
