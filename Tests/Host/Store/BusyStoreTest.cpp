@@ -5,9 +5,7 @@
 #include <sched.h>
 #include <sys/mount.h>
 
-#include <algorithm>
 #include <atomic>
-#include <chrono>
 #include <fstream>
 #include <thread>
 
@@ -35,17 +33,6 @@ class ABusyStore : InMemory, public AccountStoreFixture {
     Transaction transaction(*database);
     database->execute("fill the store", sql.c_str());
     transaction.commit();
-  }
-
-  std::chrono::nanoseconds medianOfLookUps(const std::string& client) {
-    std::vector<std::chrono::nanoseconds> times;
-    for (int round = 0; round < 201; ++round) {
-      const auto start = std::chrono::steady_clock::now();
-      get(client);
-      times.push_back(std::chrono::steady_clock::now() - start);
-    }
-    std::ranges::nth_element(times, times.begin() + 100);
-    return times[100];
   }
 };
 
@@ -94,16 +81,14 @@ TEST_F(ABusyStore, GivesEveryThreadWholeRecordsAndKeepsTheLast) {
   EXPECT_THAT(store->history({.limit = 1000}), SizeIs(writers * (rounds + 1)));
 }
 
-TEST_F(ABusyStore, FindsOneRecordAmongManyAsFastAsAmongFew) {
+TEST_F(ABusyStore, FindsOneRecordAmongMany) {
   set("client", grantNumber(1));
-  const auto amongFew = medianOfLookUps("client");
   fill(R"sql(
     WITH RECURSIVE numbers (number) AS (SELECT 1 UNION ALL SELECT number + 1 FROM numbers WHERE number < 100000)
     INSERT INTO authorizations (account_type, client_id, app_name, granted, answered_by_nobody, updated_at, digest)
     SELECT 'com.veltran.accounttype.facebook', 'other ' || number, 'Other', 1, 0, 0, 0 FROM numbers)sql");
   restart();
   EXPECT_THAT(get("client"), Optional(grantNumber(1)));
-  EXPECT_LT(medianOfLookUps("client"), 4 * amongFew) << "reading through all records would take hundreds of times as long";
 }
 
 TEST_F(ABusyStore, KeepsTheNewestOfALongHistory) {
