@@ -70,6 +70,76 @@ class AServerThatFails(unittest.TestCase):
             wait_until(lambda: session.stored_tokens() == 0, "the account's token is removed")
 
 
+class Clock:
+    """The wall clock of a daemon, put forward and back while it runs. Time that passes is not altered."""
+
+    LIBRARIES = ("/usr/lib/x86_64-linux-gnu/faketime/libfaketimeMT.so.1", "/usr/lib/aarch64-linux-gnu/faketime/libfaketimeMT.so.1")
+
+    def __init__(self, session: trial.Trial):
+        library = next((library for library in self.LIBRARIES if os.path.exists(library)), None)
+        if library is None:
+            raise unittest.SkipTest("libfaketime is not installed, so no clock can be put forward.")
+        self._file = session.root / "clock"
+        self.environment = {"LD_PRELOAD": library, "FAKETIME_TIMESTAMP_FILE": str(self._file), "FAKETIME_NO_CACHE": "1",
+                            "FAKETIME_DONT_FAKE_MONOTONIC": "1", "FAKETIME_DONT_RESET": "1"}
+        self.put("+0")
+
+    def put(self, offset: str) -> None:
+        draft = self._file.with_suffix(".new")
+        draft.write_text(f"{offset}\n", encoding="utf-8")
+        draft.rename(self._file)
+
+
+class AClockThatJumps(unittest.TestCase):
+    JUMPS = ("-30y", "+30y", "-3d", "+1d", "+0")
+
+    def test_changes_nothing_that_was_granted(self):
+        with trial.trial_with_account(log="error") as session, session.caller() as caller:
+            clock = Clock(session)
+            session.kill_accountd()
+            session.start_accountd(environment=clock.environment)
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+            for jump in self.JUMPS:
+                clock.put(jump)
+                with self.subTest(jump=jump):
+                    self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+                    self.assertTrue(caller.credential())
+            self.assertEqual(session.person.alerts, 1, "nobody was asked again")
+
+    def test_leaves_the_history_in_the_order_in_which_it_happened(self):
+        with trial.trial_with_account(answer="refuse", log="error") as session, session.caller() as caller:
+            clock = Clock(session)
+            session.kill_accountd()
+            session.start_accountd(environment=clock.environment)
+            times = []
+            for count, jump in enumerate(self.JUMPS, 1):
+                clock.put(jump)
+                self.assertEqual(caller.start_request().outcome()[0], REFUSED)
+                history = wait_until(lambda wanted=count: (rows := self._history(caller))[wanted - 1:] and rows, "it is written")
+                times.insert(0, history[0]["time"])
+                self.assertEqual([row["time"] for row in history], times)
+                caller.manage("RevokeAll", "s", [FACEBOOK])
+            self.assertNotEqual(times, sorted(times))
+
+    def test_while_access_is_taken_back_leaves_no_token_valid(self):
+        for jump in self.JUMPS:
+            with self.subTest(jump=jump), trial.trial_with_account(log="error") as session, session.caller() as caller:
+                clock = Clock(session)
+                session.kill_accountd()
+                session.start_accountd(environment=clock.environment)
+                self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+                clock.put(jump)
+                caller.manage("Revoke", "ss", [FACEBOOK, PHOTOS])
+                self.assertFalse(caller.grants()[PHOTOS]["granted"])
+                session.start_vantad()
+                wait_until(lambda: caller.revocations()[0]["state"] == "confirmed", "the server confirms")
+                self.assertNotIn('"valid":true', session.sandbox("tokens"))
+
+    @staticmethod
+    def _history(caller) -> list[dict]:
+        return caller.manage("History")[0]
+
+
 class Volume:
     """A small disk of its own under the stores' folder."""
 
