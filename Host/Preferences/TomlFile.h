@@ -22,8 +22,9 @@ class TomlError : public std::runtime_error {
 /// The file's table. Dates and times are kept as their text.
 std::optional<Dictionary> readTomlFile(const std::filesystem::path& path);
 
-/// Sets one value of the file's table, or removes it when there is none. Whatever else stands in the file stays as it is written,
-/// comments too, as far as that can be done: the value of a table with lines of its own takes the file's comments with it.
+/// Sets one value of the file's table, or removes it when there is none. Whatever else stands in the file stays as it is
+/// written, comments too, as far as that can be done: the value of a table with lines of its own takes the file's comments with
+/// it.
 void setInTomlFile(const std::filesystem::path& path, const std::string& key, const std::optional<Value>& value);
 
 /// Replaces the file: a reader sees the old content or the new one, also after a power cut. Null values are left out.
