@@ -11,7 +11,7 @@
 
 #include "AlertHelper/AlertWindow.h"
 #include "AlertHelper/Labels.h"
-#include "AlertHelper/Words.h"
+#include "Host/Alert/AlertWords.h"
 
 namespace palisade {
 namespace {
@@ -79,7 +79,7 @@ void setUpButton(Gtk::Button& button, const std::string& label, const std::strin
 
 void AlertWindow::build(const AlertQuestion& question) {
   useStyle();
-  Gtk::Widget::set_default_direction(wordsFor(question.languages).isRightToLeft() ? Gtk::TEXT_DIR_RTL : Gtk::TEXT_DIR_LTR);
+  Gtk::Widget::set_default_direction(alertWordsFor(question.languages).isRightToLeft() ? Gtk::TEXT_DIR_RTL : Gtk::TEXT_DIR_LTR);
   set_title(question.title);
   set_resizable(false);
   get_accessible()->set_role(Atk::ROLE_ALERT);
@@ -126,7 +126,7 @@ void AlertWindow::build(const AlertQuestion& question) {
 }
 
 Gtk::Widget* AlertWindow::detailsOf(const AlertSubject& subject, std::string_view languages) {
-  const Words& words = wordsFor(languages);
+  const AlertWords& words = alertWordsFor(languages);
   const bool isCertain = subject.certainty == AlertCertainty::certain;
   auto* grid = Gtk::make_managed<Gtk::Grid>();
   grid->set_column_spacing(gap);

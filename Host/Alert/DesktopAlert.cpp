@@ -4,9 +4,9 @@
 
 #include <cerrno>
 
+#include "Host/Alert/AskedQuestion.h"
 #include "Host/Alert/HelperEnding.h"
 #include "Host/Alert/HelperProcess.h"
-#include "Host/Identity/DisplayName.h"
 
 namespace palisade {
 namespace {
@@ -24,31 +24,13 @@ std::shared_ptr<DesktopAlertHandle> ownHandle(const std::shared_ptr<AlertHandle>
   return std::dynamic_pointer_cast<DesktopAlertHandle>(handle);
 }
 
-AlertQuestion questionFor(const AlertDescription& description, std::optional<AlertSubject> subject) {
-  AlertQuestion question{.title = oneLine(description.header),
-                         .message = oneLine(description.message),
-                         .refuseTitle = oneLine(description.alternateButtonTitle),
-                         .allowTitle = oneLine(description.defaultButtonTitle),
-                         .languages = "",
-                         .topMost = description.topMost};
-  if (subject) {
-    subject->applicationName = displayName(subject->applicationName);
-    subject->applicationID = displayName(subject->applicationID);
-    subject->account = displayName(subject->account);
-    question.message = isolated(question.message, subject->applicationName);
-    question.subject = std::move(subject);
-  }
-  return question;
-}
-
 }  // namespace
 
 bool DesktopAlert::isInstalled() const { return access(_options.helper.c_str(), X_OK) == 0; }
 
 std::shared_ptr<AlertHandle> DesktopAlert::createAlert(AlertAllocator, double, unsigned, int* errorPlace,
                                                        const AlertDescription& description) {
-  AlertQuestion question = questionFor(description, _options.subject());
-  question.languages = _options.languages();
+  AlertQuestion question = askedQuestion(description, _options.subject(), _options.languages());
   question.nonce = freshNonce();
   const auto frame = alertQuestionFrame(question);
   auto helper = frame ? HelperProcess::start(_options.helper, *frame) : nullptr;

@@ -1,10 +1,8 @@
-// The letters that press the buttons, and the window's own words.
+// The letters that press the buttons.
 
 #include "AlertHelper/Labels.h"
 
 #include <gmock/gmock.h>
-
-#include "AlertHelper/Words.h"
 
 namespace palisade {
 namespace {
@@ -21,14 +19,6 @@ TEST(ButtonLabels, UnderlineALetterEach) {
     EXPECT_EQ(labels.refuse, row.refuseLabel);
     EXPECT_EQ(labels.allow, row.allowLabel);
   }
-}
-
-TEST(TheWindowsWords, AreOfTheFirstLanguageThatHasAny) {
-  EXPECT_EQ(wordsFor("de_AT:de:en").language, "de");
-  EXPECT_EQ(wordsFor("tlh:pt_BR").language, "pt_BR");
-  EXPECT_EQ(wordsFor("tlh").language, "en");
-  EXPECT_EQ(wordsFor("").language, "en");
-  EXPECT_EQ(wordsFor(":::").language, "en");
 }
 
 }  // namespace

@@ -1,6 +1,6 @@
 #pragma once
 
-/// The window's own few words, in the languages of the sentences that it shows.
+/// An alert's own few words, in the languages of the sentences that it shows.
 ///
 /// Threads: a pure function over constants. Errors: a language without words gets English ones.
 
@@ -8,7 +8,7 @@
 
 namespace palisade {
 
-struct Words {
+struct AlertWords {
   std::string_view language;
   std::string_view application;
   std::string_view account;
@@ -20,6 +20,6 @@ struct Words {
 };
 
 /// `languages` are catalogue names, best first, separated by colons.
-const Words& wordsFor(std::string_view languages);
+const AlertWords& alertWordsFor(std::string_view languages);
 
 }  // namespace palisade

@@ -1,4 +1,4 @@
-#include "AlertHelper/Words.h"
+#include "Host/Alert/AlertWords.h"
 
 #include <algorithm>
 #include <array>
@@ -7,7 +7,7 @@ namespace palisade {
 namespace {
 
 // "certain" and "claimed" say how much is known about the application's identity. English is first.
-constexpr std::array<Words, 13> allWords = {{
+constexpr std::array<AlertWords, 13> allWords = {{
     {"en", "Application", "Account", "Identity", "Certain (sandboxed)", "Only claimed (not sandboxed)"},
     {"de", "Anwendung", "Konto", "Identität", "Gesichert (in einer Sandbox)", "Nur behauptet (nicht in einer Sandbox)"},
     {"fr", "Application", "Compte", "Identité", "Certaine (bac à sable)", "Seulement déclarée (hors bac à sable)"},
@@ -25,10 +25,10 @@ constexpr std::array<Words, 13> allWords = {{
 
 }  // namespace
 
-const Words& wordsFor(std::string_view languages) {
+const AlertWords& alertWordsFor(std::string_view languages) {
   while (!languages.empty()) {
     const std::string_view language = languages.substr(0, languages.find(':'));
-    const auto found = std::ranges::find(allWords, language, &Words::language);
+    const auto found = std::ranges::find(allWords, language, &AlertWords::language);
     if (found != allWords.end()) return *found;
     languages.remove_prefix(std::min(languages.size(), language.size() + 1));
   }
