@@ -45,11 +45,7 @@ int DesktopAlert::receiveResponse(const std::shared_ptr<AlertHandle>& handle, do
   response = AlertResponseNobody;
   const auto alert = ownHandle(handle);
   if (alert == nullptr) return EINVAL;
-  using Clock = HelperProcess::Clock;
-  const auto deadline = timeoutSeconds > 0
-                            ? Clock::now() + std::chrono::ceil<Clock::duration>(std::chrono::duration<double>(timeoutSeconds))
-                            : Clock::time_point::max();
-  const auto ending = alert->helper->waitForEnd(deadline);
+  const auto ending = alert->helper->waitForEnd(deadlineAfter(timeoutSeconds));
   response = responseOfEnding(ending.received, ending.waitStatus, alert->nonce);
   return 0;
 }

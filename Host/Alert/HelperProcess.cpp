@@ -13,7 +13,6 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
-#include <limits>
 #include <string_view>
 #include <vector>
 
@@ -101,13 +100,6 @@ class SpawnPlan {
   posix_spawnattr_t _attributes;
 };
 
-// For poll(2): -1 waits for ever.
-int millisecondsLeft(HelperProcess::Clock::time_point deadline) {
-  if (deadline == HelperProcess::Clock::time_point::max()) return -1;
-  const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - HelperProcess::Clock::now()).count();
-  return static_cast<int>(std::clamp<decltype(left)>(left, 0, std::numeric_limits<int>::max()));
-}
-
 }  // namespace
 
 std::unique_ptr<HelperProcess> HelperProcess::start(const std::filesystem::path& program, const std::string& questionFrame) {
@@ -146,7 +138,7 @@ HelperProcess::~HelperProcess() {
 
 void HelperProcess::takeDown() const { eventfd_write(_takenDown.number(), 1); }
 
-HelperProcess::Ending HelperProcess::waitForEnd(Clock::time_point deadline) {
+HelperProcess::Ending HelperProcess::waitForEnd(Deadline deadline) {
   Ending ending;
   bool isOpen = true;
   while (true) {

@@ -13,6 +13,7 @@
 #include <optional>
 #include <string>
 
+#include "Host/Alert/Deadline.h"
 #include "Host/Files/FileDescriptor.h"
 
 namespace palisade {
@@ -37,7 +38,7 @@ class HelperProcess {
   };
 
   /// Waits until the helper has ended, at most until `deadline`. Called once.
-  Ending waitForEnd(Clock::time_point deadline);
+  Ending waitForEnd(Deadline deadline);
 
   void takeDown() const;
 
