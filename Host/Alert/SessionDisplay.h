@@ -11,4 +11,8 @@ namespace palisade {
 /// display that is forwarded from another machine is not one: whoever asks through it may sit anywhere.
 bool hasUsableDisplay();
 
+/// Whether windows of any program can be kept above all others there: on X11, and on Wayland where the compositor has layers
+/// (zwlr_layer_shell_v1). Waits for a compositor half a second at most.
+bool keepsWindowsOnTop();
+
 }  // namespace palisade
