@@ -1,5 +1,6 @@
 #include "Host/Alert/SessionAlert.h"
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <exception>
@@ -8,12 +9,15 @@
 namespace palisade {
 namespace {
 
-constexpr std::array<std::pair<AlertFrontEnd, std::string_view>, 3> frontEndNames = {
-    {{AlertFrontEnd::desktop, "desktop"}, {AlertFrontEnd::terminal, "terminal"}, {AlertFrontEnd::nobody, "nobody"}}};
+constexpr std::array<std::pair<AlertFrontEnd, std::string_view>, 4> frontEndNames = {{{AlertFrontEnd::desktop, "desktop"},
+                                                                                      {AlertFrontEnd::portal, "portal"},
+                                                                                      {AlertFrontEnd::terminal, "terminal"},
+                                                                                      {AlertFrontEnd::nobody, "nobody"}}};
 
 void takeDownShown(const std::shared_ptr<AlertHandle>& shown) {
   // Each front end knows its own handles.
   DesktopAlert::takeDown(shown);
+  PortalAlert::takeDown(shown);
   TerminalAlert::takeDown(shown);
 }
 
@@ -49,37 +53,63 @@ SessionAlert::SessionAlert(const Options& options)
     : _choice(options.choice || !options.terminal ? options.choice : AlertFrontEnd::terminal),
       _hasTerminal(options.terminal.has_value()),
       _hasUsableDisplay(options.hasUsableDisplay),
+      _keepsWindowsOnTop(options.keepsWindowsOnTop),
       _watchLock(options.watchLock),
       _desktop(options.desktop),
+      _portal(options.portal),
       _terminal(options.terminal.value_or("")) {}
 
 bool SessionAlert::isUsable(AlertFrontEnd frontEnd) const {
   switch (frontEnd) {
     case AlertFrontEnd::desktop: return _desktop.isInstalled() && _hasUsableDisplay();
+    case AlertFrontEnd::portal: return _hasUsableDisplay() && _portal.backend();
     case AlertFrontEnd::terminal: return _hasTerminal && _terminal.isAvailable();
     case AlertFrontEnd::nobody: break;
   }
   return true;
 }
 
+// GNOME's shell shows the portal's dialogs itself.
+bool SessionAlert::prefersPortal() const { return std::ranges::count(currentDesktops(), "gnome") > 0 || !_keepsWindowsOnTop(); }
+
 AlertFrontEnd SessionAlert::frontEnd() const {
   if (_choice && isUsable(*_choice)) return *_choice;
-  for (const AlertFrontEnd candidate : {AlertFrontEnd::desktop, AlertFrontEnd::terminal}) {
+  std::array candidates = {AlertFrontEnd::desktop, AlertFrontEnd::portal, AlertFrontEnd::terminal};
+  if (prefersPortal()) std::swap(candidates[0], candidates[1]);
+  for (const AlertFrontEnd candidate : candidates) {
     if (isUsable(candidate)) return candidate;
   }
   return AlertFrontEnd::nobody;
 }
 
+std::string SessionAlert::description() const {
+  const AlertFrontEnd chosen = frontEnd();
+  const auto backend = chosen == AlertFrontEnd::portal ? _portal.backend() : std::nullopt;
+  return nameOf(chosen) + (backend ? " (" + *backend + ")" : "");
+}
+
 std::optional<std::string> SessionAlert::trouble() const {
   const AlertFrontEnd chosen = frontEnd();
   if (_choice == chosen) return std::nullopt;
+  std::string sentence;
   if (chosen == AlertFrontEnd::nobody) {
-    return "Nobody can be asked: there is no display that palisade-alert can use, and no terminal. Start accountd with "
-           "--terminal \"$(tty)\", or set terminal in accountd.toml.";
+    sentence =
+        "Nobody can be asked: there is no display that palisade-alert or a portal can use, and no terminal. Start accountd "
+        "with --terminal \"$(tty)\", or set terminal in accountd.toml.";
+  } else if (_choice) {
+    sentence = "Alerts are to be shown by the " + nameOf(*_choice) + ", which cannot be used now; the " + nameOf(chosen) +
+               " shows them.";
+  } else {
+    return std::nullopt;
   }
-  if (!_choice) return std::nullopt;
-  return "Alerts are to be shown by the " + nameOf(*_choice) + ", which cannot be used now; the " + nameOf(chosen) +
-         " shows them.";
+  const auto cause = _choice == AlertFrontEnd::portal && _hasUsableDisplay() ? _portal.trouble() : std::nullopt;
+  return cause ? sentence + " " + *cause : sentence;
+}
+
+SystemAlert& SessionAlert::showing(AlertFrontEnd frontEnd) {
+  if (frontEnd == AlertFrontEnd::desktop) return _desktop;
+  if (frontEnd == AlertFrontEnd::portal) return _portal;
+  return _terminal;
 }
 
 std::shared_ptr<AlertHandle> SessionAlert::createAlert(AlertAllocator allocator, double timeoutSeconds, unsigned flags,
@@ -89,8 +119,7 @@ std::shared_ptr<AlertHandle> SessionAlert::createAlert(AlertAllocator allocator,
     if (errorPlace != nullptr) *errorPlace = ENODEV;
     return nullptr;
   }
-  SystemAlert& shower =
-      chosen == AlertFrontEnd::desktop ? static_cast<SystemAlert&>(_desktop) : static_cast<SystemAlert&>(_terminal);
+  SystemAlert& shower = showing(chosen);
   auto shown = shower.createAlert(allocator, timeoutSeconds, flags, errorPlace, description);
   if (shown == nullptr) return nullptr;
   const auto handle = std::make_shared<SessionAlertHandle>(shower, shown);

@@ -2,10 +2,12 @@
 
 /// The system alert of a session: asks wherever the user can be asked at that moment.
 ///
-/// The front end is chosen for each alert: the configured one first, then a window of the desktop, then the terminal. When none
-/// of them can be used, nobody is asked. An alert that is to go when the session locks is taken down then, whatever shows it.
-/// Threads: as `SystemAlert` says; `takeDown`, `frontEnd` and `trouble` may be called from any thread. Ownership: a handle owns
-/// what shows it. Errors: an alert that no front end can show is a null handle, and nobody's answer.
+/// The front end is chosen for each alert: the configured one first, then whatever can keep the alert above other windows: the
+/// helper's window, or the portal's dialog on GNOME, which shows it above everything, and where no window can be kept on top.
+/// The other of the two is next, then the terminal. When none of them can be used, nobody is asked. An alert that is to go when
+/// the session locks is taken down then, whatever shows it. Threads: as `SystemAlert` says; `takeDown`, `frontEnd` and
+/// `trouble` may be called from any thread. Ownership: a handle owns what shows it. Errors: an alert that no front end can show
+/// is a null handle, and nobody's answer.
 
 #include <functional>
 #include <memory>
@@ -14,14 +16,15 @@
 #include <string_view>
 
 #include "Host/Alert/DesktopAlert.h"
+#include "Host/Alert/PortalAlert.h"
 #include "Host/Alert/SessionDisplay.h"
 #include "Host/Alert/TerminalAlert.h"
 
 namespace palisade {
 
-enum class AlertFrontEnd { desktop, terminal, nobody };
+enum class AlertFrontEnd { desktop, portal, terminal, nobody };
 
-/// "desktop", "terminal", "nobody", and back; none for another word.
+/// "desktop", "portal", "terminal", "nobody", and back; none for another word.
 std::string nameOf(AlertFrontEnd frontEnd);
 std::optional<AlertFrontEnd> alertFrontEndNamed(std::string_view name);
 
@@ -33,7 +36,9 @@ class SessionAlert final : public SystemAlert {
     /// The terminal on which to ask; none asks on none.
     std::optional<std::string> terminal = std::nullopt;
     DesktopAlert::Options desktop;
+    PortalAlert::Options portal = {};
     std::function<bool()> hasUsableDisplay = palisade::hasUsableDisplay;
+    std::function<bool()> keepsWindowsOnTop = palisade::keepsWindowsOnTop;
     /// Calls its argument, from any thread, when the session locks, as long as the result lives. May throw when locks cannot be
     /// heard of; the alert then stands through them.
     std::function<std::shared_ptr<const void>(std::function<void()>)> watchLock = [](const auto&) { return nullptr; };
@@ -43,6 +48,9 @@ class SessionAlert final : public SystemAlert {
 
   /// What would show an alert now.
   AlertFrontEnd frontEnd() const;
+
+  /// The same in words, with the portal's backend: "portal (org.freedesktop.impl.portal.desktop.gtk)".
+  std::string description() const;
 
   /// A sentence that says what to do when nobody can be asked, or when something else than what was configured asks.
   std::optional<std::string> trouble() const;
@@ -57,12 +65,16 @@ class SessionAlert final : public SystemAlert {
 
  private:
   bool isUsable(AlertFrontEnd frontEnd) const;
+  bool prefersPortal() const;
+  SystemAlert& showing(AlertFrontEnd frontEnd);
 
   std::optional<AlertFrontEnd> _choice;
   bool _hasTerminal;
   std::function<bool()> _hasUsableDisplay;
+  std::function<bool()> _keepsWindowsOnTop;
   std::function<std::shared_ptr<const void>(std::function<void()>)> _watchLock;
   DesktopAlert _desktop;
+  PortalAlert _portal;
   TerminalAlert _terminal;
 };
 

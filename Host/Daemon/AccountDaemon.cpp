@@ -8,6 +8,7 @@
 #include "Host/Accounts/ClientDirectory.h"
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Alert/SessionAlert.h"
+#include "Host/Bus/BusAccessDialog.h"
 #include "Host/Bus/BusLoop.h"
 #include "Host/Bus/BusPresence.h"
 #include "Host/Bus/BusServer.h"
@@ -107,6 +108,10 @@ struct AccountDaemon::Parts {
         frontEnd({.choice = configuration.alert,
                   .terminal = configuration.terminal,
                   .desktop = {.helper = alertHelper(), .subject = [this] { return subject(); }, .languages = alertLanguages},
+                  .portal = {.isReachable = isOnSessionBus,
+                             .open = openAccessDialog,
+                             .subject = [this] { return subject(); },
+                             .languages = alertLanguages},
                   .watchLock = [](auto onLock) { return std::make_shared<const SessionLock>(std::move(onLock)); }}),
         alert(otherAlert != nullptr ? *otherAlert : frontEnd,
               otherAlert != nullptr ? [](const std::shared_ptr<AlertHandle>&) {} : SessionAlert::takeDown),
@@ -195,7 +200,7 @@ struct AccountDaemon::Parts {
     for (const std::string& module : plugins->modules()) modules.emplace_back(module);
     Dictionary report{{"plugins", modules},
                       {"keychain", keychain->description()},
-                      {"alert", nameOf(frontEnd.frontEnd())},
+                      {"alert", frontEnd.description()},
                       {"server", server.address},
                       {"store", (stateFolder() / "accounts.sqlite").string()},
                       {"log", log.destination()},

@@ -11,7 +11,7 @@ Owns a user's accounts and decides, with its plug-ins, which applications may us
 called; see com.veltran.Accounts1 there, and palisade(1) for people.
 
   --plugins DIRECTORY   load the plug-ins in this folder
-  --alert FRONT-END     desktop, terminal or nobody; otherwise whatever the session has
+  --alert FRONT-END     desktop, portal, terminal or nobody; otherwise whatever the session has
   --terminal TTY        ask the user on this terminal, such as the one that `tty` prints
   --keychain CHOICE     automatic, secret-service or vault
   --log LEVEL           error, notice or debug
@@ -31,7 +31,7 @@ KeychainChoice keychainChoice(std::string_view word) {
 
 AlertFrontEnd alertFrontEnd(std::string_view word) {
   if (const auto choice = alertFrontEndNamed(word)) return *choice;
-  throw std::runtime_error("There is no alert '" + std::string(word) + "': it is desktop, terminal or nobody.");
+  throw std::runtime_error("There is no alert '" + std::string(word) + "': it is desktop, portal, terminal or nobody.");
 }
 
 LogLevel logLevel(std::string_view word) {

@@ -25,8 +25,8 @@ struct DaemonConfiguration {
   LogLevel logLevel = LogLevel::notice;
 };
 
-/// `table` is accountd.toml's: plugins, alert (desktop, terminal, nobody), terminal, keychain (automatic, secret-service,
-/// vault), log (error, notice, debug).
+/// `table` is accountd.toml's: plugins, alert (desktop, portal, terminal, nobody), terminal, keychain (automatic,
+/// secret-service, vault), log (error, notice, debug).
 void applyConfigurationFile(const Dictionary& table, DaemonConfiguration& configuration);
 
 /// What the command line asks for.

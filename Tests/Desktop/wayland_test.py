@@ -12,6 +12,8 @@ import unittest
 import window_test
 from window_test import ALLOWED, EXAMPLE, REFUSED, Alert, Atspi
 
+PROGRAM = sys.argv.pop(1)
+
 
 class AWindowOnWayland(unittest.TestCase):
     def ask(self):
@@ -36,6 +38,13 @@ class AWindowOnWayland(unittest.TestCase):
         alert = self.ask()
         alert.host.close()
         self.assertNotEqual(alert.process.wait(window_test.PATIENCE), 0)
+
+
+class ACompositorWithLayers(unittest.TestCase):
+    def test_has_the_helper_show_alerts_and_not_the_portal(self):
+        with subprocess.Popen([PROGRAM, "whatever", "title", window_test.HELPER], stdin=subprocess.PIPE, stdout=subprocess.PIPE,
+                              text=True) as alert:
+            self.assertEqual(alert.communicate("enough\n", window_test.PATIENCE)[0], "shown by desktop\nnobody\n")
 
 
 if __name__ == "__main__":

@@ -12,6 +12,7 @@
 #include <optional>
 
 #include "Tests/Host/Alert/PseudoTerminal.h"
+#include "Tests/Host/Identity/EnvironmentVariable.h"
 #include "Tests/Host/TemporaryFolder.h"
 
 namespace palisade {
@@ -26,6 +27,9 @@ struct Situation {
   bool hasTerminal;
   FrontEnd expected;
   bool isTrouble;
+  bool hasPortal = false;
+  bool keepsWindowsOnTop = true;
+  const char* desktops = "";
 };
 
 class ASession : public testing::TestWithParam<Situation> {};
@@ -33,25 +37,43 @@ class ASession : public testing::TestWithParam<Situation> {};
 TEST_P(ASession, AsksWhereItCan) {
   const Situation& situation = GetParam();
   const PseudoTerminal terminal;
+  const EnvironmentVariable desktops("XDG_CURRENT_DESKTOP", situation.desktops);
   SessionAlert::Options options{.choice = situation.choice, .desktop = {.helper = SCRIPTED_HELPER}};
   options.hasUsableDisplay = [&] { return situation.hasDisplay; };
+  options.keepsWindowsOnTop = [&] { return situation.keepsWindowsOnTop; };
+  options.portal.backend = [] { return "org.example.Backend"; };
+  options.portal.isReachable = [&](const auto&) { return situation.hasPortal; };
   if (situation.hasTerminal) options.terminal = terminal.path();
   const SessionAlert alert(options);
   EXPECT_EQ(alert.frontEnd(), situation.expected);
+  EXPECT_EQ(alert.description(),
+            situation.expected == FrontEnd::portal ? "portal (org.example.Backend)" : nameOf(situation.expected));
   EXPECT_EQ(alert.trouble().has_value(), situation.isTrouble) << alert.trouble().value_or("");
 }
 
 INSTANTIATE_TEST_SUITE_P(
     InAnySituation, ASession,
-    testing::Values(Situation{"NothingThere", std::nullopt, false, false, FrontEnd::nobody, true},
-                    Situation{"ADisplay", std::nullopt, true, false, FrontEnd::desktop, false},
-                    Situation{"ATerminal", std::nullopt, false, true, FrontEnd::terminal, false},
-                    Situation{"ANamedTerminalBesideADisplay", std::nullopt, true, true, FrontEnd::terminal, false},
-                    Situation{"TheDesktopChosen", FrontEnd::desktop, true, true, FrontEnd::desktop, false},
-                    Situation{"TheDesktopChosenWithoutADisplay", FrontEnd::desktop, false, true, FrontEnd::terminal, true},
-                    Situation{"TheDesktopChosenWithNothingThere", FrontEnd::desktop, false, false, FrontEnd::nobody, true},
-                    Situation{"TheTerminalChosenWithoutOne", FrontEnd::terminal, true, false, FrontEnd::desktop, true},
-                    Situation{"NobodyChosen", FrontEnd::nobody, true, true, FrontEnd::nobody, false}),
+    testing::Values(
+        Situation{"NothingThere", std::nullopt, false, false, FrontEnd::nobody, true},
+        Situation{"ADisplay", std::nullopt, true, false, FrontEnd::desktop, false},
+        Situation{"ATerminal", std::nullopt, false, true, FrontEnd::terminal, false},
+        Situation{"ANamedTerminalBesideADisplay", std::nullopt, true, true, FrontEnd::terminal, false},
+        Situation{"TheDesktopChosen", FrontEnd::desktop, true, true, FrontEnd::desktop, false},
+        Situation{"TheDesktopChosenWithoutADisplay", FrontEnd::desktop, false, true, FrontEnd::terminal, true},
+        Situation{"TheDesktopChosenWithNothingThere", FrontEnd::desktop, false, false, FrontEnd::nobody, true},
+        Situation{"TheTerminalChosenWithoutOne", FrontEnd::terminal, true, false, FrontEnd::desktop, true},
+        Situation{"NobodyChosen", FrontEnd::nobody, true, true, FrontEnd::nobody, false},
+        Situation{"APortalBesideADisplay", std::nullopt, true, false, FrontEnd::desktop, false, true},
+        Situation{"APortalOnGnome", std::nullopt, true, false, FrontEnd::portal, false, true, true, "ubuntu:GNOME"},
+        Situation{"APortalWhereNothingStaysOnTop", std::nullopt, true, false, FrontEnd::portal, false, true, false},
+        Situation{"NoPortalWhereNothingStaysOnTop", std::nullopt, true, false, FrontEnd::desktop, false, false, false},
+        Situation{"NoPortalOnGnome", std::nullopt, true, false, FrontEnd::desktop, false, false, true, "GNOME"},
+        Situation{"APortalWithoutADisplay", std::nullopt, false, false, FrontEnd::nobody, true, true, false},
+        Situation{"ANamedTerminalBesideAPortal", std::nullopt, true, true, FrontEnd::terminal, false, true, false},
+        Situation{"ThePortalChosen", FrontEnd::portal, true, true, FrontEnd::portal, false, true},
+        Situation{"ThePortalChosenWithoutABackend", FrontEnd::portal, true, true, FrontEnd::desktop, true},
+        Situation{"ThePortalChosenWithoutADisplay", FrontEnd::portal, false, true, FrontEnd::terminal, true, true},
+        Situation{"TheDesktopChosenOnGnome", FrontEnd::desktop, true, false, FrontEnd::desktop, false, true, false, "GNOME"}),
     [](const auto& instance) { return instance.param.name; });
 
 class ADesktopSession : public testing::Test {
@@ -123,6 +145,42 @@ TEST_F(ADesktopSession, TakesAnAlertDownOnDemand) {
   EXPECT_EQ(responseTo(alert, handle), AlertResponseNobody);
 }
 
+TEST(ASessionWhosePortalWasChosen, SaysWhyAnotherAsksInItsPlace) {
+  SessionAlert::Options options{.choice = FrontEnd::portal, .desktop = {.helper = SCRIPTED_HELPER}};
+  options.hasUsableDisplay = [] { return true; };
+  options.portal.backend = [] { return std::nullopt; };
+  EXPECT_THAT(SessionAlert(options).trouble(), testing::Optional(testing::AllOf(testing::HasSubstr("the desktop shows them"),
+                                                                                testing::HasSubstr("Install one"))));
+  options.desktop.helper.clear();
+  EXPECT_THAT(SessionAlert(options).trouble(),
+              testing::Optional(testing::AllOf(testing::HasSubstr("Nobody can be asked"), testing::HasSubstr("Install one"))));
+}
+
+TEST(ASessionWithAPortal, ShowsItsAlertsThereAndTakesThemDown) {
+  struct Dialog final : AccessDialog {
+    explicit Dialog(bool& flag) : isTakenDown(flag) {}
+    std::optional<AccessReply> waitForReply(Deadline) override {
+      return isTakenDown ? std::nullopt : std::optional(AccessReply{.response = 0, .after = std::chrono::seconds(1)});
+    }
+    void takeDown() override { isTakenDown = true; }
+    bool& isTakenDown;
+  };
+  bool isTakenDown = false;
+  SessionAlert::Options options{.choice = FrontEnd::portal, .desktop = {}};
+  options.hasUsableDisplay = [] { return true; };
+  options.portal = {.backend = [] { return "org.example.Backend"; },
+                    .isReachable = [](const auto&) { return true; },
+                    .open = [&](const auto&, const auto&) { return std::make_unique<Dialog>(isTakenDown); }};
+  SessionAlert alert(options);
+  const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, {});
+  AlertResponse response = 42;
+  EXPECT_EQ(alert.receiveResponse(handle, 0, response), 0);
+  EXPECT_EQ(response, AlertResponseDefaultButton);
+  SessionAlert::takeDown(handle);
+  EXPECT_EQ(alert.receiveResponse(handle, 0, response), 0);
+  EXPECT_EQ(response, AlertResponseNobody);
+}
+
 TEST(ASessionWithoutAnybody, ShowsNothingAndGetsNobodysAnswer) {
   SessionAlert alert({.choice = FrontEnd::nobody, .desktop = {.helper = SCRIPTED_HELPER}});
   int error = 0;
@@ -134,7 +192,7 @@ TEST(ASessionWithoutAnybody, ShowsNothingAndGetsNobodysAnswer) {
 }
 
 TEST(FrontEnds, HaveNames) {
-  for (const FrontEnd frontEnd : {FrontEnd::desktop, FrontEnd::terminal, FrontEnd::nobody}) {
+  for (const FrontEnd frontEnd : {FrontEnd::desktop, FrontEnd::portal, FrontEnd::terminal, FrontEnd::nobody}) {
     EXPECT_EQ(alertFrontEndNamed(nameOf(frontEnd)), frontEnd);
   }
   EXPECT_EQ(alertFrontEndNamed("window"), std::nullopt);
@@ -163,6 +221,7 @@ TEST(ADisplay, IsUsableWhenItsServerTakesConnections) {
   EXPECT_TRUE(hasUsableDisplay());
   setenv("WAYLAND_DISPLAY", (folder.path() / "wayland-7").c_str(), 1);
   EXPECT_TRUE(hasUsableDisplay());
+  EXPECT_FALSE(keepsWindowsOnTop()) << "its compositor says nothing";
   close(server);
 }
 

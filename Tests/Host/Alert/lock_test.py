@@ -42,9 +42,9 @@ class AnAlert(dbusmock.DBusTestCase):
         super().tearDownClass()
 
     def setUp(self):
-        self.alert = subprocess.Popen([PROGRAM, HELPER], stdout=subprocess.PIPE, text=True)
+        self.alert = subprocess.Popen([PROGRAM, "desktop", "linger", HELPER], stdout=subprocess.PIPE, text=True)
         self.addCleanup(self.end)
-        self.assertEqual(self.alert.stdout.readline(), "shown\n")
+        self.assertEqual(self.alert.stdout.readline(), "shown by desktop\n")
 
     def end(self):
         self.alert.kill()
@@ -97,8 +97,8 @@ class AnAlert(dbusmock.DBusTestCase):
 class AnAlertWithoutABus(unittest.TestCase):
     def test_stands(self):
         nowhere = dict(os.environ, DBUS_SESSION_BUS_ADDRESS="unix:path=/nonexistent", DBUS_SYSTEM_BUS_ADDRESS="unix:path=/nonexistent")
-        with subprocess.Popen([PROGRAM, HELPER], stdout=subprocess.PIPE, text=True, env=nowhere) as alert:
-            self.assertEqual(alert.stdout.readline(), "shown\n")
+        with subprocess.Popen([PROGRAM, "desktop", "linger", HELPER], stdout=subprocess.PIPE, text=True, env=nowhere) as alert:
+            self.assertEqual(alert.stdout.readline(), "shown by desktop\n")
             alert.kill()
 
 

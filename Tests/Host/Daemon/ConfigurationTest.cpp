@@ -60,8 +60,10 @@ TEST(ASetting, IsTakenFromTheFileAndFromTheCommandLine) {
 }
 
 TEST(TheAlert, IsOneOfItsWords) {
-  for (const auto& [word, expected] : std::vector<std::pair<std::string, AlertFrontEnd>>{
-           {"desktop", AlertFrontEnd::desktop}, {"terminal", AlertFrontEnd::terminal}, {"nobody", AlertFrontEnd::nobody}}) {
+  for (const auto& [word, expected] : std::vector<std::pair<std::string, AlertFrontEnd>>{{"desktop", AlertFrontEnd::desktop},
+                                                                                         {"portal", AlertFrontEnd::portal},
+                                                                                         {"terminal", AlertFrontEnd::terminal},
+                                                                                         {"nobody", AlertFrontEnd::nobody}}) {
     for (const auto& made : configurationsWith("alert", word)) EXPECT_THAT(made.alert, Optional(expected));
   }
 }
@@ -89,8 +91,8 @@ TEST(AWrongSetting, IsNamedWithWhatIsRight) {
     std::string sentence;
   };
   for (const auto& [name, value, sentence] : std::vector<Case>{
-           {"alert", "window", "There is no alert 'window': it is desktop, terminal or nobody."},
-           {"alert", "", "There is no alert '': it is desktop, terminal or nobody."},
+           {"alert", "window", "There is no alert 'window': it is desktop, portal, terminal or nobody."},
+           {"alert", "", "There is no alert '': it is desktop, portal, terminal or nobody."},
            {"keychain", "Vault", "There is no keychain 'Vault': it is automatic, secret-service or vault."},
            {"log", "all", "There is no log level 'all': it is error, notice or debug."},
            {"colour", "red", "There is no setting 'colour'."},
