@@ -6,6 +6,7 @@
 #include <map>
 #include <stdexcept>
 #include <string>
+#include <thread>
 
 namespace palisade {
 namespace {
@@ -53,6 +54,31 @@ bool saysItIsLocked(sdbus::Message& message) {
 
 }  // namespace
 
+// Reads a bus until it is destroyed or the bus is gone.
+class SessionLock::Listener {
+ public:
+  explicit Listener(std::unique_ptr<sdbus::IConnection> bus) : _bus(std::move(bus)), _thread([this] { read(); }) {}
+  Listener(const Listener&) = delete;
+  Listener& operator=(const Listener&) = delete;
+  ~Listener() {
+    _bus->leaveEventLoop();
+    _thread.join();
+  }
+
+ private:
+  void read() {
+    try {
+      _bus->enterEventLoop();
+    } catch (const sdbus::Error&) {
+      // A bus that is gone tells of no more locks.
+      return;
+    }
+  }
+
+  std::unique_ptr<sdbus::IConnection> _bus;
+  std::thread _thread;
+};
+
 SessionLock::SessionLock(std::function<void()> onLock) : _onLock(std::move(onLock)) {
   for (const auto listen : {&SessionLock::listenToScreenSaver, &SessionLock::listenToLogins}) {
     try {
@@ -61,12 +87,10 @@ SessionLock::SessionLock(std::function<void()> onLock) : _onLock(std::move(onLoc
       continue;
     }
   }
-  if (_connections.empty()) throw std::runtime_error("Neither the session bus nor the system bus tells of locks.");
+  if (_listeners.empty()) throw std::runtime_error("Neither the session bus nor the system bus tells of locks.");
 }
 
-SessionLock::~SessionLock() {
-  for (const auto& connection : _connections) connection->leaveEventLoop();
-}
+SessionLock::~SessionLock() = default;
 
 // Screen savers differ in where their object is; what they say is the same.
 void SessionLock::listenToScreenSaver() {
@@ -75,8 +99,7 @@ void SessionLock::listenToScreenSaver() {
     bus->addMatch("type='signal',member='ActiveChanged',interface='" + std::string(interface) + "'",
                   whenLocked(_onLock, becomesActive), sdbus::floating_slot);
   }
-  bus->enterEventLoopAsync();
-  _connections.push_back(std::move(bus));
+  _listeners.push_back(std::make_unique<Listener>(std::move(bus)));
 }
 
 // `loginctl lock-session` sends Lock; a desktop that locks by itself sets LockedHint. Other users' sessions are none of ours.
@@ -90,8 +113,7 @@ void SessionLock::listenToLogins() {
     bus->addMatch(ofSession + "member='PropertiesChanged',interface='org.freedesktop.DBus.Properties'",
                   whenLocked(_onLock, saysItIsLocked), sdbus::floating_slot);
   }
-  bus->enterEventLoopAsync();
-  _connections.push_back(std::move(bus));
+  _listeners.push_back(std::make_unique<Listener>(std::move(bus)));
 }
 
 }  // namespace palisade

@@ -3,16 +3,12 @@
 /// Hears that the user's session is being locked: from the session's screen saver, and from the login manager.
 ///
 /// Threads: made and destroyed by one thread; `onLock` comes from a thread of its own until the destructor returns. Ownership:
-/// owns its connections. Errors: a bus that cannot be reached is not listened to; without any, the constructor throws
-/// `std::runtime_error`.
+/// owns its connections. Errors: a bus that cannot be reached is not listened to, nor is one that has gone; without any, the
+/// constructor throws `std::runtime_error`.
 
 #include <functional>
 #include <memory>
 #include <vector>
-
-namespace sdbus {
-class IConnection;
-}
 
 namespace palisade {
 
@@ -24,11 +20,13 @@ class SessionLock {
   ~SessionLock();
 
  private:
+  class Listener;
+
   void listenToScreenSaver();
   void listenToLogins();
 
   std::function<void()> _onLock;
-  std::vector<std::unique_ptr<sdbus::IConnection>> _connections;
+  std::vector<std::unique_ptr<Listener>> _listeners;
 };
 
 }  // namespace palisade
