@@ -6,9 +6,9 @@
 #include <glibmm/main.h>
 #include <gtk/gtk.h>
 #include <gtkmm/main.h>
-#include <signal.h>
 #include <sys/prctl.h>
 
+#include <csignal>
 #include <cstdio>
 
 #include "AlertHelper/AlertWindow.h"

@@ -57,10 +57,12 @@ void Output::list(const Rows& rows, const std::vector<Column>& columns, std::str
     return;
   }
   std::vector<std::string> headings;
+  headings.reserve(columns.size());
   for (const Column& column : columns) headings.push_back(column.heading);
   Table table(std::move(headings));
   for (const Dictionary& row : rows) {
     std::vector<std::string> cells;
+    cells.reserve(columns.size());
     for (const Column& column : columns) cells.push_back(cellOf(row, column));
     table.add(std::move(cells));
   }

@@ -1,7 +1,5 @@
 #include "Cli/Table.h"
 
-#include <wchar.h>
-
 #include <algorithm>
 #include <cstdlib>
 #include <cwchar>

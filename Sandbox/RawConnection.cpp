@@ -33,7 +33,7 @@ void RawConnection::waitForClient() {
 void RawConnection::reset() {
   // Connecting a stream socket to nowhere ends its connection with a reset.
   const sockaddr nowhere = {.sa_family = AF_UNSPEC, .sa_data = {}};
-  connect(SSL_get_fd(&_connection), &nowhere, sizeof nowhere);
+  static_cast<void>(connect(SSL_get_fd(&_connection), &nowhere, sizeof nowhere));
 }
 
 }  // namespace palisade::sandbox

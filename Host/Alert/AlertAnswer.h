@@ -23,7 +23,7 @@ AlertNonce freshNonce();
 
 /// As lower-case hexadecimal digits, and back; none for anything else.
 std::string hexadecimal(const AlertNonce& nonce);
-std::optional<AlertNonce> nonceFromHexadecimal(std::string_view digits);
+std::optional<AlertNonce> nonceFromHexadecimal(std::string_view text);
 
 /// What became of the question, as it stands in the frame.
 enum class AlertWord : std::uint32_t {

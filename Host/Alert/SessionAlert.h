@@ -26,7 +26,7 @@ enum class AlertFrontEnd { desktop, portal, terminal, nobody };
 
 /// "desktop", "portal", "terminal", "nobody", and back; none for another word.
 std::string nameOf(AlertFrontEnd frontEnd);
-std::optional<AlertFrontEnd> alertFrontEndNamed(std::string_view name);
+std::optional<AlertFrontEnd> alertFrontEndNamed(std::string_view word);
 
 class SessionAlert final : public SystemAlert {
  public:

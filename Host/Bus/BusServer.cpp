@@ -90,7 +90,7 @@ sdbus::UnixFd pipeHolding(const std::string& content) {
   int ends[2];
   if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0)
     throw BusFailure(BusFailureKind::failed, "No pipe could be made for the token.");
-  const sdbus::UnixFd reader(ends[0], sdbus::adopt_fd);
+  sdbus::UnixFd reader(ends[0], sdbus::adopt_fd);
   const sdbus::UnixFd writer(ends[1], sdbus::adopt_fd);
   if (write(writer.get(), content.data(), content.size()) != static_cast<ssize_t>(content.size())) {
     throw BusFailure(BusFailureKind::failed, "The token does not fit into a pipe.");

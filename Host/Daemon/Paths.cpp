@@ -41,7 +41,7 @@ std::filesystem::path stateFolder() { return baseDirectory("XDG_STATE_HOME", ".l
 std::filesystem::path configurationFolder() { return baseDirectory("XDG_CONFIG_HOME", ".config"); }
 
 std::filesystem::path configurationFile(const std::string& name) {
-  const std::filesystem::path own = configurationFolder() / name;
+  std::filesystem::path own = configurationFolder() / name;
   std::error_code error;
   if (std::filesystem::exists(own, error)) return own;
   for (const auto& folder : searchedFolders("XDG_CONFIG_DIRS", "/usr/local/etc/xdg:/etc/xdg")) {

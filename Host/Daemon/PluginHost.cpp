@@ -42,6 +42,7 @@ std::shared_ptr<AccountAccessPlugin> PluginHost::pluginFor(std::string_view acco
 
 std::vector<std::string> PluginHost::modules() const {
   std::vector<std::string> paths;
+  paths.reserve(_entries.size());
   for (const Entry& entry : _entries) paths.push_back(entry.loaded.path.string());
   return paths;
 }

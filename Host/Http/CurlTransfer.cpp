@@ -124,7 +124,7 @@ void CurlTransfer::setHeaders() {
   const auto add = [this](const std::string& line) {
     curl_slist* const longer = _curl.listAppend(_headers.get(), line.c_str());
     if (longer == nullptr) throw std::bad_alloc();
-    _headers.release();
+    static_cast<void>(_headers.release());  // it is the end of the longer one now
     _headers.reset(longer);
   };
   add("Accept: application/json");

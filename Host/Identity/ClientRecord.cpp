@@ -126,7 +126,7 @@ std::string localizedName(const ClientRecord& record) {
   const auto locales = userLocales();
   if (record.desktopFile) {
     if (const auto name = nameInDesktopFile(*record.desktopFile)) {
-      const std::string shown = displayName(textForLocales(*name, locales));
+      std::string shown = displayName(textForLocales(*name, locales));
       if (!shown.empty()) return shown;
     }
   }

@@ -25,7 +25,7 @@ class JournalLog final : public Log {
 
   bool isEnabled(LogLevel level) const override { return level <= _highestLevel; }
   void write(const LogRecord& record) override;
-  void logAccessRequest(const AccessRequestRecord& record) override;
+  void logAccessRequest(const AccessRequestRecord& request) override;
 
   /// "journal" or "stderr".
   std::string_view destination() const;

@@ -52,7 +52,7 @@ class Table {
     for (const auto& [key, value] : _table) {
       if (std::find(_asked.begin(), _asked.end(), key) != _asked.end()) continue;
       std::string known;
-      for (const std::string& name : _asked) known += (known.empty() ? "" : ", ") + name;
+      for (const std::string& name : _asked) known.append(known.empty() ? "" : ", ").append(name);
       throw ServerConfigurationError("There is no setting \"" + _prefix + key + "\" here. Known are: " + known + ".");
     }
   }
