@@ -74,7 +74,7 @@ int tellAnswer(const Output& output, const AccessAnswer& answer) {
     case AccessAnswer::Response::granted: output.say("Access is granted.", object); return yes;
     case AccessAnswer::Response::withdrawn:
       object.set("withdrawn", true);
-      output.say("Nobody answered. Nothing was recorded; ask again.", object);
+      output.say(reason.empty() ? "Nobody answered. Nothing was recorded; ask again." : "Nobody was asked. " + reason, object);
       return no;
     default: output.say(reason.empty() ? "Access is refused." : "Access is refused: " + reason, object); return no;
   }

@@ -31,6 +31,7 @@ enum class BusFailureKind {
   noSuchClient,
   notGranted,
   tooManyRequests,
+  notAsked,
   keychainUnavailable,
   storeUnavailable,
   failed

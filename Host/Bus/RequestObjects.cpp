@@ -46,6 +46,7 @@ const char* nameOf(BusFailureKind kind) {
     case BusFailureKind::noSuchClient: return "NoSuchClient";
     case BusFailureKind::notGranted: return "NotGranted";
     case BusFailureKind::tooManyRequests: return "TooManyRequests";
+    case BusFailureKind::notAsked: return "NotAsked";
     case BusFailureKind::keychainUnavailable: return "KeychainUnavailable";
     case BusFailureKind::storeUnavailable: return "StoreUnavailable";
     case BusFailureKind::failed: break;
@@ -131,7 +132,7 @@ void BusRequest::fail(const BusFailure& failure) {
     return;
   }
   const auto error = busError(failure);
-  finish({.response = AccessResponse::refused,
+  finish({.response = failure.kind() == BusFailureKind::notAsked ? AccessResponse::withdrawn : AccessResponse::refused,
           .error = Error{.domain = error.getName(), .code = 0, .description = failure.what()}});
 }
 

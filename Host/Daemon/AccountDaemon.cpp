@@ -19,6 +19,7 @@
 #include "Host/Daemon/HealthChecks.h"
 #include "Host/Daemon/Operation.h"
 #include "Host/Daemon/OperationKeychain.h"
+#include "Host/Daemon/OperationLog.h"
 #include "Host/Daemon/Paths.h"
 #include "Host/Daemon/PluginHost.h"
 #include "Host/Daemon/StateLock.h"
@@ -113,24 +114,27 @@ struct AccountDaemon::Parts {
                              .subject = [this] { return subject(); },
                              .languages = alertLanguages},
                   .watchLock = [](auto onLock) { return std::make_shared<const SessionLock>(std::move(onLock)); }}),
+        coolDown(configuration.coolDown),
         alert(otherAlert != nullptr ? *otherAlert : frontEnd,
-              otherAlert != nullptr ? [](const std::shared_ptr<AlertHandle>&) {} : SessionAlert::takeDown),
+              otherAlert != nullptr ? [](const std::shared_ptr<AlertHandle>&) {} : SessionAlert::takeDown, coolDown, log),
         service({.store = store,
                  .history = history,
                  .keychain = *keychain,
                  .outbox = outbox,
                  .clients = clients,
+                 .coolDown = coolDown,
                  .preferences = preferences,
                  .pluginFor = [this](std::string_view accountType) { return plugins->pluginFor(accountType); },
                  .revocations = [this] { return revocations(); },
                  .status = [this] { return status(); }}),
+        pluginLog(log),
         pluginKeychain(*keychain, store, [this](const std::string& clientID) { return service.operationOf(clientID); }),
         bus(service) {
     lock.emplace(stateFolder(), "accountd", patienceWithAnother);
     // Only the one daemon of these stores may repair: another could be in the middle of a grant.
     for (const std::string& sentence : repairAfterCrash(store, *keychain, outbox)) tell(sentence);
     if (!outbox.pending().empty()) bus.start(socialDaemonBusName);
-    plugins.emplace(configuration.plugins, PlatformServices{.log = &log,
+    plugins.emplace(configuration.plugins, PlatformServices{.log = &pluginLog,
                                                             .keychain = &pluginKeychain,
                                                             .social = &social,
                                                             .alert = &alert,
@@ -234,8 +238,10 @@ struct AccountDaemon::Parts {
   ThreadSerialQueueFactory queues;
   NlohmannJsonParser json;
   SessionAlert frontEnd;
+  AlertCoolDown coolDown;
   AlertScheduler alert;
   AccountOperations service;
+  OperationLog pluginLog;
   OperationKeychain pluginKeychain;
   BusServer bus;
   std::optional<PluginHost> plugins;

@@ -38,6 +38,7 @@ AccessOutcome AccountOperations::authorize(const BusCaller& caller, const std::s
                   [&](auto& plugin, const auto& type, const auto& store, auto completion) {
                     // The person who manages grants has decided; what is stored is their answer.
                     Operation::current()->userHasAnswered();
+                    _parts.coolDown.note(client->id(), AlertEnding::allowed);
                     Operation::current()->aboutToWait();
                     plugin.authorizeAccessToAccountsOfType(type, client, store, std::move(completion));
                   });

@@ -17,6 +17,7 @@
 #include "Host/Accounts/AccessHistory.h"
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Bus/AccountsService.h"
+#include "Host/Daemon/AlertCoolDown.h"
 #include "Host/Daemon/ClientLanes.h"
 #include "Host/Daemon/Operation.h"
 #include "Host/Identity/ClientRegistry.h"
@@ -38,6 +39,7 @@ class AccountOperations final : public AccountsService {
     Keychain& keychain;
     Outbox& outbox;
     const ClientRegistry& clients;
+    AlertCoolDown& coolDown;
     TomlPreferencesStore& preferences;
     PluginFinder pluginFor;
     std::function<Rows()> revocations;

@@ -19,10 +19,14 @@ called; see com.veltran.Accounts1 there, and palisade(1) for people.
   --version             show the version
 
 The same names can stand in accountd.toml in $XDG_CONFIG_HOME/palisade, or in /etc/xdg/palisade for everybody: keychain = "vault"
+accountd.toml(5) describes them, and some more.
 The server's address stands in server.toml beside it.
 )";
 
 namespace {
+
+constexpr std::int64_t mostRefusals = 1000;
+constexpr std::int64_t minutesOfAWeek = 7 * 24 * 60;
 
 KeychainChoice keychainChoice(std::string_view word) {
   if (const auto choice = keychainChoiceNamed(word)) return *choice;
@@ -57,10 +61,31 @@ void apply(std::string_view name, const std::string& value, DaemonConfiguration&
   }
 }
 
+std::int64_t wholeNumber(std::string_view name, const Value& value, std::int64_t least, std::int64_t most) {
+  if (value.integer() == nullptr || *value.integer() < least || *value.integer() > most) {
+    throw std::runtime_error("'" + std::string(name) + "' is to be a whole number from " + std::to_string(least) + " to " +
+                             std::to_string(most) + ".");
+  }
+  return *value.integer();
+}
+
+// Whether the name is a number's; numbers stand in the file only.
+bool applyNumber(std::string_view name, const Value& value, DaemonConfiguration& configuration) {
+  if (name == "cool_down_after_refusals") {
+    configuration.coolDown.refusals = static_cast<unsigned>(wholeNumber(name, value, 0, mostRefusals));
+  } else if (name == "cool_down_minutes") {
+    configuration.coolDown.length = std::chrono::minutes(wholeNumber(name, value, 1, minutesOfAWeek));
+  } else {
+    return false;
+  }
+  return true;
+}
+
 }  // namespace
 
 void applyConfigurationFile(const Dictionary& table, DaemonConfiguration& configuration) {
   for (const auto& [name, value] : table) {
+    if (applyNumber(name, value, configuration)) continue;
     if (value.string() == nullptr) throw std::runtime_error("'" + name + "' is to be a text in quotes.");
     apply(name, *value.string(), configuration);
   }

@@ -9,6 +9,7 @@
 #include <string>
 
 #include "Host/Alert/SessionAlert.h"
+#include "Host/Daemon/AlertCoolDown.h"
 #include "Host/Keychain/OpenKeychain.h"
 #include "Platform/Log.h"
 #include "Platform/Value.h"
@@ -23,10 +24,11 @@ struct DaemonConfiguration {
   std::optional<std::string> terminal = std::nullopt;
   KeychainChoice keychain = KeychainChoice::automatic;
   LogLevel logLevel = LogLevel::notice;
+  AlertCoolDown::Limits coolDown = {};
 };
 
 /// `table` is accountd.toml's: plugins, alert (desktop, portal, terminal, nobody), terminal, keychain (automatic,
-/// secret-service, vault), log (error, notice, debug).
+/// secret-service, vault), log (error, notice, debug), and the numbers cool_down_after_refusals and cool_down_minutes.
 void applyConfigurationFile(const Dictionary& table, DaemonConfiguration& configuration);
 
 /// What the command line asks for.

@@ -41,6 +41,10 @@ class Operation {
   /// Calls `interrupt` when the operation is withdrawn while the result lives, or at once if it has been.
   [[nodiscard]] std::shared_ptr<const void> interruptWith(std::function<void()> interrupt);
 
+  /// An alert of the operation stands before the user.
+  void userIsAsked() { _userAsked.store(true, std::memory_order_release); }
+  bool wasUserAsked() const { return _userAsked.load(std::memory_order_acquire); }
+
   /// Whether the user has answered: pressed one of the two buttons.
   void userHasAnswered() { _userAnswered.store(true, std::memory_order_release); }
   bool isAnsweredByUser() const { return _userAnswered.load(std::memory_order_acquire); }
@@ -49,7 +53,8 @@ class Operation {
   void alertWentUnanswered() { _wentUnanswered.store(true, std::memory_order_release); }
   bool isLeftUnanswered() const { return isWithdrawn() || _wentUnanswered.load(std::memory_order_acquire); }
 
-  /// A step of the operation could not be stored: whatever its plug-in answers, it has failed. The first failure counts.
+  /// A step of the operation could not be stored, or its user is not to be asked: whatever its plug-in answers, it has failed.
+  /// The first failure counts.
   void fail(const BusFailure& failure);
   std::optional<BusFailure> failure() const;
 
@@ -59,6 +64,7 @@ class Operation {
   std::function<void()> _beforeFirstWait;
   const std::optional<Intent> _grant;
   std::atomic<bool> _isWithdrawn = false;
+  std::atomic<bool> _userAsked = false;
   std::atomic<bool> _userAnswered = false;
   std::atomic<bool> _wentUnanswered = false;
   mutable std::mutex _mutex;

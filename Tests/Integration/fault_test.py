@@ -107,7 +107,8 @@ class AClockThatJumps(unittest.TestCase):
             self.assertEqual(session.person.alerts, 1, "nobody was asked again")
 
     def test_leaves_the_history_in_the_order_in_which_it_happened(self):
-        with trial.trial_with_account(answer="refuse", log="error") as session, session.caller() as caller:
+        every_question = {"cool_down_after_refusals": 0}
+        with trial.trial_with_account(every_question, answer="refuse", log="error") as session, session.caller() as caller:
             clock = Clock(session)
             session.kill_accountd()
             session.start_accountd(environment=clock.environment)
@@ -120,6 +121,20 @@ class AClockThatJumps(unittest.TestCase):
                 self.assertEqual([row["time"] for row in history], times)
                 caller.manage("RevokeAll", "s", [FACEBOOK])
             self.assertNotEqual(times, sorted(times))
+
+    def test_neither_ends_nor_lengthens_a_cool_down(self):
+        with trial.trial_with_account(answer="refuse", log="error") as session, session.caller() as caller:
+            clock = Clock(session)
+            session.kill_accountd()
+            session.start_accountd(environment=clock.environment)
+            for _ in range(3):
+                self.assertEqual(caller.start_request().outcome()[0], REFUSED)
+                caller.manage("RevokeAll", "s", [FACEBOOK])
+            for jump in self.JUMPS:
+                clock.put(jump)
+                with self.subTest(jump=jump), self.assertRaisesRegex(BusError, "NotAsked: .* Ask again in (60|59) minutes"):
+                    caller.start_request().outcome()
+            self.assertEqual(session.person.alerts, 3)
 
     def test_while_access_is_taken_back_leaves_no_token_valid(self):
         for jump in self.JUMPS:

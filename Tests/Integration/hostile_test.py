@@ -33,9 +33,10 @@ def nested_variant(depth: int):
 
 class HostileCallers(unittest.TestCase):
     answer = "nothing"
+    settings = {}
 
     def setUp(self):
-        self.session = self.enterContext(trial.trial_with_account(answer=self.answer, log="error"))
+        self.session = self.enterContext(trial.trial_with_account(self.settings, answer=self.answer, log="error"))
         self.daemon = self.session.accountd.pid
         self.caller = self.enterContext(self.session.caller())
 
@@ -224,6 +225,9 @@ class Floods(HostileCallers):
 
 
 class Leaving(HostileCallers):
+    # Leaving so often would cost an application the user's attention; here it is to come again and again.
+    settings = {"cool_down_after_refusals": 0}
+
     def test_at_every_moment_leaves_nothing_behind(self):
         """The moments of a request: before its reply, before, while and after the alert stands."""
         for step in range(60):

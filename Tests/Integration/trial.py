@@ -1,6 +1,7 @@
 """A session for tests: a private bus, a Facebook server, both daemons and a person, each of which a test can start, stop and alter."""
 
 import contextlib
+import json
 import os
 import pathlib
 import pty
@@ -203,11 +204,11 @@ class Trial:
             encoding="utf-8")
 
     def configure(self, **settings) -> None:
-        """Writes accountd.toml."""
+        """Writes accountd.toml, texts in quotes and numbers without."""
         settings = {"plugins": f"{BUILD}/plugins", "terminal": self.person.path, "keychain": "vault",
                     "log": self.log_level} | settings
         (self.configuration / "accountd.toml").write_text(
-            "".join(f'{name} = "{value}"\n' for name, value in settings.items()), encoding="utf-8")
+            "".join(f"{name} = {json.dumps(value)}\n" for name, value in settings.items()), encoding="utf-8")
 
     def start_accountd(self, **more) -> subprocess.Popen:
         """Starts the daemon and returns when it owns its name; what is called then is answered when it serves."""
@@ -253,9 +254,10 @@ class Trial:
         return self.run("palisade-sandbox", *words).stdout
 
 
-def trial_with_account(**settings) -> Trial:
-    trial = Trial(**settings)
+def trial_with_account(settings: dict | None = None, **more) -> Trial:
+    trial = Trial(**more)
     try:
+        trial.configure(**(settings or {}))
         trial.start_accountd()
         trial.add_account()
         return trial

@@ -42,6 +42,8 @@ TEST(AConfiguration, HasDefaults) {
   EXPECT_EQ(configuration.terminal, std::nullopt);
   EXPECT_EQ(configuration.keychain, KeychainChoice::automatic);
   EXPECT_EQ(configuration.logLevel, LogLevel::notice);
+  EXPECT_EQ(configuration.coolDown.refusals, 3U);
+  EXPECT_EQ(configuration.coolDown.length, std::chrono::hours(1));
 }
 
 // Each way of saying the same.
@@ -84,6 +86,34 @@ TEST(TheLogLevel, IsOneOfItsWords) {
   }
 }
 
+TEST(TheCoolDown, IsTwoNumbersInTheFile) {
+  DaemonConfiguration configuration;
+  applyConfigurationFile({{"cool_down_after_refusals", 0}, {"cool_down_minutes", 90}}, configuration);
+  EXPECT_EQ(configuration.coolDown.refusals, 0U);
+  EXPECT_EQ(configuration.coolDown.length, std::chrono::minutes(90));
+}
+
+TEST(TheCoolDown, IsRefusedBeyondItsBounds) {
+  struct Case {
+    std::string name;
+    std::vector<Value> values;
+    std::string sentence;
+  };
+  for (const auto& [name, values, sentence] : std::vector<Case>{
+           {"cool_down_after_refusals",
+            {-1, 1001, "3", true, 2.5, Array{3}},
+            "'cool_down_after_refusals' is to be a whole number from 0 to 1000."},
+           {"cool_down_minutes",
+            {0, -1, 10081, "60", 1.5, Dictionary()},
+            "'cool_down_minutes' is to be a whole number from 1 to 10080."},
+       }) {
+    for (const Value& value : values) {
+      DaemonConfiguration configuration;
+      EXPECT_THAT([&] { applyConfigurationFile({{name, value}}, configuration); }, ThrowsMessage<std::runtime_error>(sentence));
+    }
+  }
+}
+
 TEST(AWrongSetting, IsNamedWithWhatIsRight) {
   struct Case {
     std::string name;
@@ -104,7 +134,7 @@ TEST(AWrongSetting, IsNamedWithWhatIsRight) {
   }
 }
 
-TEST(AFile, HoldsTextsOnly) {
+TEST(AWord, IsATextInTheFile) {
   for (const char* name : {"plugins", "alert", "terminal", "keychain", "log"}) {
     for (const Value& value : std::vector<Value>{1, true, Array{"desktop"}, Dictionary()}) {
       DaemonConfiguration configuration;
@@ -151,7 +181,7 @@ TEST(TheFileThatIsInstalled, ShowsEverySettingAsItCanBeWritten) {
 
   const std::optional<Dictionary> table = readTomlFile(uncommented);
   ASSERT_TRUE(table);
-  EXPECT_THAT(*table, SizeIs(5));
+  EXPECT_THAT(*table, SizeIs(7));
   DaemonConfiguration configuration;
   EXPECT_NO_THROW(applyConfigurationFile(*table, configuration));
 }

@@ -102,6 +102,14 @@ TEST(AnOperation, IsLeftUnansweredWhenItIsWithdrawnOrItsAlertIs) {
   EXPECT_FALSE(operation.isAnsweredByUser());
 }
 
+TEST(AnOperation, KnowsWhetherItsUserWasAsked) {
+  Operation operation(nullptr);
+  EXPECT_FALSE(operation.wasUserAsked());
+  operation.userIsAsked();
+  EXPECT_TRUE(operation.wasUserAsked());
+  EXPECT_FALSE(operation.isAnsweredByUser());
+}
+
 TEST(AnOperation, KnowsItsFirstFailure) {
   Operation operation(nullptr);
   EXPECT_FALSE(operation.failure());
