@@ -57,7 +57,9 @@ SessionAlert::SessionAlert(const Options& options)
       _watchLock(options.watchLock),
       _desktop(options.desktop),
       _portal(options.portal),
-      _terminal(options.terminal.value_or("")) {}
+      _terminal({.terminal = options.terminal.value_or(""),
+                 .subject = options.desktop.subject,
+                 .languages = options.desktop.languages}) {}
 
 bool SessionAlert::isUsable(AlertFrontEnd frontEnd) const {
   switch (frontEnd) {

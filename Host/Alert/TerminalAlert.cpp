@@ -14,6 +14,7 @@
 #include <string_view>
 #include <utility>
 
+#include "Host/Alert/AskedQuestion.h"
 #include "Host/Alert/TerminalDialog.h"
 #include "Host/Files/FileDescriptor.h"
 
@@ -41,7 +42,7 @@ void writeAll(int descriptor, std::string_view text) {
   }
 }
 
-enum class Key { none, selectAlternate, selectDefault, selectOther, press, close };
+enum class Key { none, selectRefuse, selectAllow, selectOther, press, close };
 
 // Takes the first key off `input`, which is not empty: an escape sequence (ECMA-48) or a byte. One read may bring several.
 std::string_view takeKey(std::string_view& input) {
@@ -60,8 +61,8 @@ std::string_view takeKey(std::string_view& input) {
 
 // The keys of a two-button dialog. An escape sequence that is not an arrow is no key of ours; a lone Escape closes.
 Key keyOf(std::string_view input) {
-  if (input == "\x1b[D" || input == "\x1bOD") return Key::selectAlternate;
-  if (input == "\x1b[C" || input == "\x1bOC") return Key::selectDefault;
+  if (input == "\x1b[D" || input == "\x1bOD") return Key::selectRefuse;
+  if (input == "\x1b[C" || input == "\x1bOC") return Key::selectAllow;
   if (input == "\t" || input == "\x1b[Z") return Key::selectOther;
   if (input == "\r" || input == "\n" || input == " ") return Key::press;
   if (input == "\x1b" || input == "\x03" || input == "\x04") return Key::close;
@@ -77,10 +78,10 @@ int millisecondsUntil(Clock::time_point deadline) {
 
 class TerminalAlertHandle final : public AlertHandle {
  public:
-  TerminalAlertHandle(FileDescriptor terminal, FileDescriptor takenDown, AlertDescription description)
+  TerminalAlertHandle(FileDescriptor terminal, FileDescriptor takenDown, AlertQuestion question)
       : _terminal(std::move(terminal)),
         _takenDown(std::move(takenDown)),
-        _description(std::move(description)) {
+        _question(std::move(question)) {
     tcgetattr(_terminal.number(), &_earlierSettings);
     termios keys = _earlierSettings;
     cfmakeraw(&keys);
@@ -103,13 +104,11 @@ class TerminalAlertHandle final : public AlertHandle {
       for (std::string_view input(buffer, length); !input.empty();) {
         switch (keyOf(takeKey(input))) {
           case Key::close: return AlertResponseNobody;
-          case Key::selectAlternate: select(DialogButton::alternate); break;
-          case Key::selectDefault: select(DialogButton::defaultButton); break;
-          case Key::selectOther:
-            select(_selected == DialogButton::alternate ? DialogButton::defaultButton : DialogButton::alternate);
-            break;
+          case Key::selectRefuse: select(DialogButton::refuse); break;
+          case Key::selectAllow: select(DialogButton::allow); break;
+          case Key::selectOther: select(_selected == DialogButton::refuse ? DialogButton::allow : DialogButton::refuse); break;
           case Key::press:
-            if (_selected == DialogButton::alternate) return AlertResponseAlternateButton;
+            if (_selected == DialogButton::refuse) return AlertResponseAlternateButton;
             if (Clock::now() >= armedAt) return AlertResponseDefaultButton;
             armedAt = Clock::now() + armedAfter;
             break;
@@ -121,7 +120,7 @@ class TerminalAlertHandle final : public AlertHandle {
 
  private:
   void draw() {
-    const std::string dialog = drawDialog(_description, _selected, columnsOfTerminal(_terminal.number()));
+    const std::string dialog = drawDialog(_question, _selected, columnsOfTerminal(_terminal.number()));
     _drawnLines = static_cast<std::size_t>(std::ranges::count(dialog, '\n'));
     writeAll(_terminal.number(), dialog);
   }
@@ -149,9 +148,9 @@ class TerminalAlertHandle final : public AlertHandle {
 
   FileDescriptor _terminal;
   FileDescriptor _takenDown;
-  AlertDescription _description;
+  AlertQuestion _question;
   termios _earlierSettings{};
-  DialogButton _selected = DialogButton::defaultButton;
+  DialogButton _selected = DialogButton::allow;
   std::size_t _drawnLines = 0;
 };
 
@@ -161,21 +160,18 @@ std::shared_ptr<TerminalAlertHandle> own(const std::shared_ptr<AlertHandle>& han
 
 }  // namespace
 
-TerminalAlert::TerminalAlert(std::string terminal, std::chrono::milliseconds armedAfter)
-    : _terminal(std::move(terminal)),
-      _armedAfter(armedAfter) {}
-
-bool TerminalAlert::isAvailable() const { return openTerminal(_terminal).isOpen(); }
+bool TerminalAlert::isAvailable() const { return openTerminal(_options.terminal).isOpen(); }
 
 std::shared_ptr<AlertHandle> TerminalAlert::createAlert(AlertAllocator, double, unsigned, int* errorPlace,
                                                         const AlertDescription& description) {
-  FileDescriptor terminal = openTerminal(_terminal);
+  FileDescriptor terminal = openTerminal(_options.terminal);
   FileDescriptor takenDown(eventfd(0, EFD_CLOEXEC));
   if (!terminal.isOpen() || !takenDown.isOpen()) {
     if (errorPlace != nullptr) *errorPlace = ENOTTY;
     return nullptr;
   }
-  return std::make_shared<TerminalAlertHandle>(std::move(terminal), std::move(takenDown), description);
+  return std::make_shared<TerminalAlertHandle>(std::move(terminal), std::move(takenDown),
+                                               askedQuestion(description, _options.subject(), _options.languages()));
 }
 
 int TerminalAlert::receiveResponse(const std::shared_ptr<AlertHandle>& handle, double timeoutSeconds, AlertResponse& response) {
@@ -185,7 +181,7 @@ int TerminalAlert::receiveResponse(const std::shared_ptr<AlertHandle>& handle, d
   const auto deadline = timeoutSeconds > 0
                             ? Clock::now() + std::chrono::ceil<Clock::duration>(std::chrono::duration<double>(timeoutSeconds))
                             : Clock::time_point::max();
-  response = alert->waitForAnswer(_armedAfter, deadline);
+  response = alert->waitForAnswer(_options.armedAfter, deadline);
   return 0;
 }
 

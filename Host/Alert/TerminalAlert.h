@@ -10,17 +10,28 @@
 /// before, or too soon, presses nothing and starts the half second again.
 
 #include <chrono>
+#include <functional>
+#include <optional>
 #include <string>
 
+#include "Host/Alert/AlertQuestion.h"
 #include "Platform/SystemAlert.h"
 
 namespace palisade {
 
 class TerminalAlert final : public SystemAlert {
  public:
-  /// `terminal` is opened for each alert: "/dev/tty", or the path of another terminal of the user's.
-  explicit TerminalAlert(std::string terminal = "/dev/tty",
-                         std::chrono::milliseconds armedAfter = std::chrono::milliseconds(500));
+  struct Options {
+    /// Opened for each alert: "/dev/tty", or the path of another terminal of the user's.
+    std::string terminal;
+    /// Who asks through the calling thread; called in `createAlert`. None when that is not known.
+    std::function<std::optional<AlertSubject>()> subject = [] { return std::nullopt; };
+    /// Catalogue names, best first, separated by colons; called in `createAlert`.
+    std::function<std::string()> languages = [] { return std::string("en"); };
+    std::chrono::milliseconds armedAfter{500};
+  };
+
+  explicit TerminalAlert(Options options) : _options(std::move(options)) {}
 
   /// Whether an alert could be shown now.
   bool isAvailable() const;
@@ -34,8 +45,7 @@ class TerminalAlert final : public SystemAlert {
   static void takeDown(const std::shared_ptr<AlertHandle>& handle);
 
  private:
-  std::string _terminal;
-  std::chrono::milliseconds _armedAfter;
+  Options _options;
 };
 
 }  // namespace palisade

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "Host/Alert/AlertWords.h"
 #include "Host/Alert/TerminalText.h"
 
 namespace palisade {
@@ -9,6 +10,7 @@ namespace {
 
 constexpr std::size_t widest = 76;
 constexpr std::size_t narrowest = 30;
+constexpr std::size_t columnGap = 2;
 constexpr std::string_view bold = "\x1b[1m";
 constexpr std::string_view reverse = "\x1b[7m";
 constexpr std::string_view plain = "\x1b[0m";
@@ -19,37 +21,85 @@ std::string repeated(std::string_view text, std::size_t times) {
   return result;
 }
 
-// One line of the frame: `shown` takes `shownColumns` columns on the screen, whatever escape sequences it holds.
-std::string framed(std::string_view shown, std::size_t shownColumns, std::size_t inner) {
-  const std::size_t padding = inner > shownColumns ? inner - shownColumns : 0;
-  return "│ " + std::string(shown) + std::string(padding, ' ') + " │\r\n";
+std::string padded(std::string text, std::size_t columns) {
+  const std::size_t used = columnsOf(text);
+  return text.append(columns > used ? columns - used : 0, ' ');
 }
 
-std::string button(std::string_view title, bool isSelected) {
-  const std::string text = "[ " + std::string(title) + " ]";
-  return isSelected ? std::string(reverse) + text + std::string(plain) : text;
+// The lines of the dialog, from top to bottom, between the edges of the frame.
+class Frame {
+ public:
+  explicit Frame(std::size_t columns) : _inner(std::clamp(columns, narrowest + 4, widest + 4) - 4) { addEdge("┌", "┐"); }
+
+  void addEmptyLine() { addLine("", 0); }
+
+  void addText(std::string_view text, std::string_view style = "") { addRow("", 0, text, style); }
+
+  // Text beside a label that takes `labelColumns` columns.
+  void addRow(std::string_view label, std::size_t labelColumns, std::string_view text, std::string_view style = "") {
+    std::string side = padded(std::string(label), labelColumns);
+    for (const std::string& line : wrapped(harmless(text), _inner - labelColumns)) {
+      const std::string shown = style.empty() ? line : std::string(style) + line + std::string(plain);
+      addLine(side + shown, labelColumns + columnsOf(line));
+      side.assign(labelColumns, ' ');
+    }
+  }
+
+  void addButtons(std::string_view first, std::string_view second, DialogButton selected) {
+    const std::string one = "[ " + harmless(first) + " ]";
+    const std::string other = "[ " + harmless(second) + " ]";
+    const auto shown = [](const std::string& button, bool isSelected) {
+      return isSelected ? std::string(reverse) + button + std::string(plain) : button;
+    };
+    addLine(shown(one, selected == DialogButton::refuse) + std::string(columnGap, ' ') +
+                shown(other, selected == DialogButton::allow),
+            columnsOf(one) + columnGap + columnsOf(other));
+  }
+
+  std::string finished() {
+    addEdge("└", "┘");
+    return std::move(_lines);
+  }
+
+ private:
+  void addEdge(std::string_view left, std::string_view right) {
+    _lines.append(left).append(repeated("─", _inner + 2)).append(right).append("\r\n");
+  }
+
+  // `shown` takes `columns` columns on the screen, whatever escape sequences it holds.
+  void addLine(std::string_view shown, std::size_t columns) {
+    const std::size_t padding = _inner > columns ? _inner - columns : 0;
+    _lines.append("│ ").append(shown).append(padding, ' ').append(" │\r\n");
+  }
+
+  std::size_t _inner;
+  std::string _lines;
+};
+
+void addSubject(Frame& frame, const AlertSubject& subject, const AlertWords& words) {
+  const std::size_t labels =
+      std::max({columnsOf(words.application), columnsOf(words.identity), columnsOf(words.account)}) + columnGap;
+  const bool isCertain = subject.certainty == AlertCertainty::certain;
+  frame.addRow(words.application, labels, subject.applicationName);
+  if (subject.applicationID != subject.applicationName) frame.addRow("", labels, subject.applicationID);
+  frame.addRow(words.identity, labels, isCertain ? words.certain : words.claimed, isCertain ? "" : bold);
+  if (!subject.account.empty()) frame.addRow(words.account, labels, subject.account);
 }
 
 }  // namespace
 
-std::string drawDialog(const AlertDescription& description, DialogButton selected, std::size_t columns) {
-  const std::size_t inner = std::clamp(columns, narrowest + 4, widest + 4) - 4;
-  const std::string alternate = harmless(description.alternateButtonTitle);
-  const std::string defaultTitle = harmless(description.defaultButtonTitle);
-
-  std::string dialog = "┌" + repeated("─", inner + 2) + "┐\r\n";
-  for (const std::string& line : wrapped(harmless(description.header), inner)) {
-    dialog += framed(std::string(bold) + line + std::string(plain), columnsOf(line), inner);
+std::string drawDialog(const AlertQuestion& question, DialogButton selected, std::size_t columns) {
+  Frame frame(columns);
+  frame.addText(question.title, bold);
+  frame.addEmptyLine();
+  frame.addText(question.message);
+  frame.addEmptyLine();
+  if (question.subject) {
+    addSubject(frame, *question.subject, alertWordsFor(question.languages));
+    frame.addEmptyLine();
   }
-  dialog += framed("", 0, inner);
-  for (const std::string& line : wrapped(harmless(description.message), inner)) dialog += framed(line, columnsOf(line), inner);
-  dialog += framed("", 0, inner);
-
-  const std::string buttons = button(alternate, selected == DialogButton::alternate) + "  " +
-                              button(defaultTitle, selected == DialogButton::defaultButton);
-  dialog += framed(buttons, columnsOf(alternate) + columnsOf(defaultTitle) + 10, inner);
-  dialog += "└" + repeated("─", inner + 2) + "┘\r\n";
-  return dialog;
+  frame.addButtons(question.refuseTitle, question.allowTitle, selected);
+  return frame.finished();
 }
 
 }  // namespace palisade

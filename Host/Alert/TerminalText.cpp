@@ -40,8 +40,7 @@ bool isBidirectionalControl(char32_t character) {
 }
 
 bool isControl(char32_t character) {
-  return character < 0x20 || (character >= 0x7F && character < 0xA0) || character == U'\u2028' || character == U'\u2029' ||
-         isBidirectionalControl(character);
+  return character < 0x20 || (character >= 0x7F && character < 0xA0) || character == U'\u2028' || character == U'\u2029';
 }
 
 // wcwidth(3) knows wide characters only in a UTF-8 locale, whatever locale the program runs in.
@@ -87,7 +86,7 @@ std::string harmless(std::string_view text) {
       result += "\uFFFD";
     } else if (isControl(character)) {
       result += ' ';
-    } else {
+    } else if (!isBidirectionalControl(character)) {
       result += text.substr(0, length);
     }
     text.remove_prefix(length);

@@ -2,6 +2,8 @@
 
 /// Text as a terminal shows it: measured in columns, made harmless, and broken into lines.
 ///
+/// Words that are written from right to left stay in the order in which they are read: terminals that know such writing turn
+/// them around themselves, and those that do not would show any other order as wrongly.
 /// Threads: all functions are pure. Errors: bytes that are not UTF-8 show as U+FFFD.
 
 #include <string>
@@ -13,8 +15,9 @@ namespace palisade {
 /// How many columns `text` takes; East Asian wide characters take two.
 std::size_t columnsOf(std::string_view text);
 
-/// `text` with every control character, line break and bidirectional override replaced by a blank: what an application calls
-/// itself can neither move the cursor nor rearrange the sentence around it.
+/// `text` with every control character and line break replaced by a blank, and without the marks, isolates and overrides of
+/// the direction of writing, which take no column: what an application calls itself can neither move the cursor nor rearrange
+/// the sentence around it.
 std::string harmless(std::string_view text);
 
 /// `text` in lines of at most `columns` columns, broken at blanks where there are any.

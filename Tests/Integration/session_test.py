@@ -35,6 +35,8 @@ class AnApplicationThatAsks(unittest.TestCase):
         story = subprocess.run([PROJECT / "Tools/Trial/session", BUILD], env=environment, text=True, stdin=subprocess.DEVNULL,
                                stdout=subprocess.PIPE, stderr=subprocess.STDOUT, timeout=120, check=True).stdout
         self.assertIn("“Photos” would like to use your Facebook account to see your basic profile", story)
+        for line in ("Application  Photos", "org.example.photos", "Identity     Only claimed (not sandboxed)", "Account      ada"):
+            self.assertIn(line, story)
         self.assertIn('"audience":"ALL_FRIENDS"', story)
         self.assertEqual(story.count("No terminal here"), 1, "the second request is answered from the grant")
         self.assertRegex(story, r"1234567890 +confirmed")

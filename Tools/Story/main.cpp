@@ -37,7 +37,7 @@ int usageError(std::string_view problem) {
 
 int main(int argumentCount, char** arguments) {
   std::filesystem::path module;
-  palisade::TerminalAlert terminal;
+  palisade::TerminalAlert terminal({.terminal = "/dev/tty"});
   bool asksUser = terminal.isAvailable() && isatty(STDOUT_FILENO) == 1;
   bool allows = true;
 

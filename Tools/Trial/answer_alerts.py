@@ -20,7 +20,7 @@ KEYS = {"allow": b"\r", "refuse": b"\t\r", "close": b"\x1b", "nothing": b""}
 
 def text_of(dialog: str) -> str:
     """The dialog's own words, without its frame."""
-    lines = (line.strip("│ \r") for line in ESCAPE_SEQUENCE.sub("", dialog).splitlines())
+    lines = (line.removeprefix("│ ").rstrip("│ \r") for line in ESCAPE_SEQUENCE.sub("", dialog).splitlines())
     return "\n".join("    " + line for line in lines if line and line[0] not in "┌└")
 
 

@@ -19,6 +19,8 @@ namespace {
 
 using std::chrono::hours;
 using std::chrono::milliseconds;
+using testing::AllOf;
+using testing::HasSubstr;
 
 constexpr AlertResponse nobody = AlertResponseNobody;
 
@@ -38,7 +40,7 @@ class ATerminalAlert : public testing::Test {
 
   // Shows an alert, waits until it stands on the screen, types `keys` one after another and answers what became of it.
   AlertResponse answerAfter(std::initializer_list<std::string> keys, milliseconds armedAfter = milliseconds(0)) {
-    TerminalAlert alert(_terminal, armedAfter);
+    TerminalAlert alert({.terminal = _terminal, .armedAfter = armedAfter});
     const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
     readUntil("┘");
     auto answer = std::async(std::launch::async, [&] {
@@ -87,6 +89,16 @@ TEST_F(ATerminalAlert, TakesEscapeInterruptAndEndOfFileForNobodysAnswer) {
   for (const char* key : {"\x1b", "\x03", "\x04"}) EXPECT_EQ(answerAfter({key}), nobody);
 }
 
+TEST_F(ATerminalAlert, SaysWhoAsksInTheUsersLanguage) {
+  TerminalAlert alert(
+      {.terminal = _terminal,
+       .subject = [] { return AlertSubject{.applicationName = "Photos", .applicationID = "org.example.photos"}; },
+       .languages = [] { return "de"; }});
+  const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
+  EXPECT_THAT(readUntil("┘"),
+              AllOf(HasSubstr("Anwendung  Photos"), HasSubstr("org.example.photos"), HasSubstr("Nur behauptet")));
+}
+
 TEST_F(ATerminalAlert, IgnoresKeysThatMeanNothing) { EXPECT_EQ(answerAfter({"y", "\x1b"}), nobody); }
 
 TEST_F(ATerminalAlert, AllowsNothingBeforeItHasStoodLongEnough) {
@@ -104,7 +116,7 @@ TEST_F(ATerminalAlert, ForgetsWhatWasTypedBeforeItStood) {
 }
 
 TEST_F(ATerminalAlert, EndsUnansweredWhenTheTerminalHangsUp) {
-  TerminalAlert alert(_terminal, milliseconds(0));
+  TerminalAlert alert({.terminal = _terminal, .armedAfter = milliseconds(0)});
   const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
   close(_screen);
   _screen = -1;
@@ -114,7 +126,7 @@ TEST_F(ATerminalAlert, EndsUnansweredWhenTheTerminalHangsUp) {
 }
 
 TEST_F(ATerminalAlert, EndsUnansweredWhenItIsTakenDown) {
-  TerminalAlert alert(_terminal, milliseconds(0));
+  TerminalAlert alert({.terminal = _terminal, .armedAfter = milliseconds(0)});
   const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
   auto answer = std::async(std::launch::async, [&] {
     AlertResponse response = 0;
@@ -126,7 +138,7 @@ TEST_F(ATerminalAlert, EndsUnansweredWhenItIsTakenDown) {
 }
 
 TEST_F(ATerminalAlert, EndsUnansweredWhenItsTimeIsOver) {
-  TerminalAlert alert(_terminal);
+  TerminalAlert alert({.terminal = _terminal});
   const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
   AlertResponse response = 0;
   alert.receiveResponse(handle, 0.001, response);
@@ -137,7 +149,7 @@ TEST_F(ATerminalAlert, GivesTheTerminalBackAsItWas) {
   const int terminal = open(_terminal.c_str(), O_RDWR | O_NOCTTY | O_CLOEXEC);
   termios before{};
   tcgetattr(terminal, &before);
-  TerminalAlert alert(_terminal);
+  TerminalAlert alert({.terminal = _terminal});
   auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
   termios during{};
   tcgetattr(terminal, &during);
@@ -151,7 +163,7 @@ TEST_F(ATerminalAlert, GivesTheTerminalBackAsItWas) {
 
 TEST(ATerminalAlertWithoutATerminal, IsNotCreatedAndIsNobodysAnswer) {
   for (const char* path : {"/nonexistent", "/dev/null"}) {
-    TerminalAlert alert(path);
+    TerminalAlert alert({.terminal = path});
     EXPECT_FALSE(alert.isAvailable());
     int error = 0;
     const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, &error, {});
