@@ -1,88 +1,55 @@
 #include "Host/Alert/TerminalText.h"
 
-#include <wchar.h>
-
-#include <clocale>
-#include <cstdint>
+#include <unilbrk.h>
+#include <unistr.h>
+#include <uniwidth.h>
 
 namespace palisade {
 namespace {
 
-constexpr char32_t replacementCharacter = U'\uFFFD';
+constexpr const char* encoding = "UTF-8";
 
 struct Decoded {
-  char32_t character;
+  ucs4_t character;
   std::size_t length;
 };
 
-// The first character of non-empty `text`. A malformed sequence is one byte long (RFC 3629 forbids overlong forms, surrogates
-// and anything beyond U+10FFFF).
+const std::uint8_t* bytesOf(std::string_view text) { return reinterpret_cast<const std::uint8_t*>(text.data()); }
+
+// The first character of non-empty `text`; a byte that begins none is U+FFFD.
 Decoded firstCharacter(std::string_view text) {
-  const auto byte = [&](std::size_t index) { return static_cast<std::uint8_t>(text[index]); };
-  const std::uint8_t lead = byte(0);
-  if (lead < 0x80) return {lead, 1};
-  const std::size_t length = lead >= 0xF0 && lead < 0xF5 ? 4 : lead >= 0xE0 ? 3 : 2;
-  if (lead < 0xC2 || lead >= 0xF5 || text.size() < length) return {replacementCharacter, 1};
-  char32_t character = lead & (0x7F >> length);
-  for (std::size_t index = 1; index < length; ++index) {
-    if ((byte(index) & 0xC0) != 0x80) return {replacementCharacter, 1};
-    character = character << 6 | (byte(index) & 0x3F);
-  }
-  constexpr char32_t smallest[] = {0, 0, 0x80, 0x800, 0x10000};
-  const bool isSurrogate = character >= 0xD800 && character < 0xE000;
-  if (character < smallest[length] || character > 0x10FFFF || isSurrogate) return {replacementCharacter, 1};
-  return {character, length};
+  Decoded decoded{};
+  const int length = u8_mbtoucr(&decoded.character, bytesOf(text), text.size());
+  if (length < 1) return {.character = U'\uFFFD', .length = 1};
+  decoded.length = static_cast<std::size_t>(length);
+  return decoded;
 }
 
-bool isBidirectionalControl(char32_t character) {
+bool isBidirectionalControl(ucs4_t character) {
   return character == U'\u061C' || character == U'\u200E' || character == U'\u200F' ||
          (character >= U'\u202A' && character <= U'\u202E') || (character >= U'\u2066' && character <= U'\u2069');
 }
 
-bool isControl(char32_t character) {
+bool isControl(ucs4_t character) {
   return character < 0x20 || (character >= 0x7F && character < 0xA0) || character == U'\u2028' || character == U'\u2029';
 }
 
-// wcwidth(3) knows wide characters only in a UTF-8 locale, whatever locale the program runs in.
-class Utf8CharacterType {
- public:
-  Utf8CharacterType() : _earlier(uselocale(shared())) {}
-  Utf8CharacterType(const Utf8CharacterType&) = delete;
-  Utf8CharacterType& operator=(const Utf8CharacterType&) = delete;
-  ~Utf8CharacterType() { uselocale(_earlier); }
-
- private:
-  static locale_t shared() {
-    static const locale_t utf8 = newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr);
-    return utf8;
-  }
-
-  locale_t _earlier;
-};
-
-std::size_t columnsOf(char32_t character) {
-  const int columns = wcwidth(static_cast<wchar_t>(character));
-  return columns < 0 ? 1 : static_cast<std::size_t>(columns);
+bool isHangul(ucs4_t character) {
+  return (character >= 0x1100 && character < 0x1200) || (character >= 0x3130 && character < 0x3190) ||
+         (character >= 0xA960 && character < 0xA980) || (character >= 0xAC00 && character < 0xD800);
 }
 
 }  // namespace
 
 std::size_t columnsOf(std::string_view text) {
-  const Utf8CharacterType utf8;
-  std::size_t columns = 0;
-  while (!text.empty()) {
-    const auto [character, length] = firstCharacter(text);
-    columns += columnsOf(character);
-    text.remove_prefix(length);
-  }
-  return columns;
+  return static_cast<std::size_t>(u8_width(bytesOf(text), text.size(), encoding));
 }
 
 std::string harmless(std::string_view text) {
   std::string result;
   while (!text.empty()) {
     const auto [character, length] = firstCharacter(text);
-    if (character == replacementCharacter) {
+    if (character == U'\uFFFD') {
       result += "\uFFFD";
     } else if (isControl(character)) {
       result += ' ';
@@ -95,15 +62,23 @@ std::string harmless(std::string_view text) {
 }
 
 std::vector<std::string> wrapped(std::string_view text, std::size_t columns) {
-  const Utf8CharacterType utf8;
+  // What is known of the place before each byte (UAX #14).
+  std::string breaks(text.size(), UC_BREAK_PROHIBITED);
+  u8_possible_linebreaks(bytesOf(text), text.size(), encoding, breaks.data());
+
   std::vector<std::string> lines(1);
   std::size_t used = 0;
-  // Where the line may be broken: after its last blank.
+  // Where the line may be broken; 0 is nowhere.
   std::size_t breakAt = 0;
-  while (!text.empty()) {
-    const auto [character, length] = firstCharacter(text);
-    const std::size_t width = columnsOf(character);
-    if (used + width > columns && character != U' ') {
+  ucs4_t previous = ' ';
+  for (std::size_t place = 0; place < text.size();) {
+    const auto [character, length] = firstCharacter(text.substr(place));
+    const std::string_view shown = text.substr(place, length);
+    const std::size_t width = columnsOf(shown);
+    const bool isWithinKoreanWord = previous != ' ' && (isHangul(previous) || isHangul(character));
+    if (breaks[place] == UC_BREAK_POSSIBLE && !isWithinKoreanWord) breakAt = lines.back().size();
+    // Blanks may stand beyond the edge: they go when the line ends.
+    while (used > 0 && used + width > columns && character != ' ') {
       std::string rest = breakAt > 0 ? lines.back().substr(breakAt) : std::string();
       if (breakAt > 0) lines.back().resize(breakAt);
       while (lines.back().ends_with(' ')) lines.back().pop_back();
@@ -111,10 +86,10 @@ std::vector<std::string> wrapped(std::string_view text, std::size_t columns) {
       lines.push_back(std::move(rest));
       breakAt = 0;
     }
-    lines.back() += text.substr(0, length);
+    lines.back() += shown;
     used += width;
-    if (character == U' ') breakAt = lines.back().size();
-    text.remove_prefix(length);
+    previous = character;
+    place += length;
   }
   while (lines.back().ends_with(' ')) lines.back().pop_back();
   return lines;

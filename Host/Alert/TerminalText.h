@@ -20,7 +20,9 @@ std::size_t columnsOf(std::string_view text);
 /// the sentence around it.
 std::string harmless(std::string_view text);
 
-/// `text` in lines of at most `columns` columns, broken at blanks where there are any.
+/// `text`, which is harmless, in lines of at most `columns` columns. They end where such text may be broken: after a blank or,
+/// where words stand without blanks, as in Chinese and Japanese, between characters, but never so that a line begins with a
+/// mark that closes or ends with one that opens. Korean words stay whole. What is too long for a line is broken at its edge.
 std::vector<std::string> wrapped(std::string_view text, std::size_t columns);
 
 }  // namespace palisade
