@@ -3,6 +3,7 @@
 #include <atkmm/object.h>
 #include <gdkmm/monitor.h>
 #include <giomm/desktopappinfo.h>
+#include <gtk/gtk.h>
 #include <gtkmm/cssprovider.h>
 #include <gtkmm/grid.h>
 #include <gtkmm/icontheme.h>
@@ -29,14 +30,22 @@ constexpr const char* style = R"(
   window.layer { border-radius: 9px; border: 1px solid alpha(@theme_fg_color, 0.35); }
 )";
 
+// Without the hyphens that would show where a long word is broken: an identifier shows no letter that it does not have.
+void showAsItIs(Gtk::Label& label) {
+  PangoAttrList* attributes = pango_attr_list_new();
+  pango_attr_list_insert(attributes, pango_attr_insert_hyphens_new(FALSE));
+  gtk_label_set_attributes(label.gobj(), attributes);
+  pango_attr_list_unref(attributes);
+}
+
 Gtk::Label* makeLabel(const Glib::ustring& text, const char* styleClass, int characters = charactersOfALine) {
   auto* label = Gtk::make_managed<Gtk::Label>();
   label->set_text(text);
   label->set_line_wrap(true);
   label->set_line_wrap_mode(Pango::WRAP_WORD_CHAR);
   label->set_max_width_chars(characters);
-  label->set_width_chars(std::min<int>(characters, static_cast<int>(text.size())));
   label->set_xalign(0);
+  showAsItIs(*label);
   label->get_style_context()->add_class(styleClass);
   return label;
 }
@@ -67,6 +76,19 @@ void useStyle() {
   const auto provider = Gtk::CssProvider::create();
   provider->load_from_data(style);
   Gtk::StyleContext::add_provider_for_screen(Gdk::Screen::get_default(), provider, GTK_STYLE_PROVIDER_PRIORITY_APPLICATION);
+}
+
+// As wide as it would like to be, and as high as it then is, but no higher than that: left alone, GTK asks for the height of
+// texts that are broken into more lines than they will be.
+void fitTo(Gtk::ScrolledWindow& scroller, Gtk::Widget& content, int mostHigh) {
+  content.show_all();
+  int least = 0;
+  int width = 0;
+  int height = 0;
+  content.get_preferred_width(least, width);
+  content.get_preferred_height_for_width(width, least, height);
+  content.set_size_request(width, -1);
+  scroller.set_min_content_height(std::min(height, mostHigh));
 }
 
 void setUpButton(Gtk::Button& button, const std::string& label, const std::string& name) {
@@ -101,10 +123,6 @@ void AlertWindow::build(const AlertQuestion& question) {
   // It takes no focus, which rests on a button at all times; Page Up and Page Down scroll it.
   _scroller.set_can_focus(false);
   _scroller.set_policy(Gtk::POLICY_NEVER, Gtk::POLICY_AUTOMATIC);
-  _scroller.set_propagate_natural_height(true);
-  Gdk::Rectangle area;
-  if (const auto monitor = get_display()->get_monitor(0)) monitor->get_workarea(area);
-  _scroller.set_max_content_height(std::max(area.get_height() - 12 * gap, 10 * gap));
   _scroller.add(*content);
 
   const ButtonLabels labels = buttonLabels(question.refuseTitle, question.allowTitle);
@@ -123,6 +141,10 @@ void AlertWindow::build(const AlertQuestion& question) {
   _frame.pack_start(*buttons, Gtk::PACK_SHRINK);
   add(_frame);
   set_default(_allow);
+
+  Gdk::Rectangle area;
+  if (const auto monitor = get_display()->get_monitor(0)) monitor->get_workarea(area);
+  fitTo(_scroller, *content, std::max(area.get_height() - 12 * gap, 10 * gap));
 }
 
 Gtk::Widget* AlertWindow::detailsOf(const AlertSubject& subject, std::string_view languages) {
