@@ -1,7 +1,13 @@
-"""Shows alerts one after another and takes a picture of each. Run by Tools/Desktop/pictures."""
+"""Shows alerts one after another and takes a picture of each. Run by Tools/Desktop/pictures.
+
+    take_pictures.py x11 | wayland BUILD-FOLDER FOLDER
+"""
 
 import gettext
+import html
+import os
 import pathlib
+import re
 import subprocess
 import sys
 import tempfile
@@ -9,28 +15,36 @@ import time
 
 from alert import Alert
 
-BUILD, FOLDER = map(pathlib.Path, sys.argv[1:3])
+BUILD, FOLDER = map(pathlib.Path, sys.argv[2:4])
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
 HELPER = BUILD / "bin/palisade-alert"
 NAMES = {"ar": "صور", "ja": "フォト"}
-# What a window needs to appear and to arm itself.
+# What the sample application asks for, as the pages in Docs/sentences call it.
+ASKED_FOR = "two things of the user; posts for friends"
+# What a window needs to appear, and to arm itself.
 LONGEST_WAIT = 20
 SETTLED_AFTER = 1.5
 
 
-def texts(language):
-    """The texts of the alert in that language, as the sample application would cause them."""
+def sentence(language, name):
+    page = (PROJECT / f"Docs/sentences/{language}.md").read_text(encoding="utf-8")
+    row = re.search(rf"^\| {ASKED_FOR} \| (.*) \|$", page, re.MULTILINE)[1]
+    return html.unescape(re.sub("<[^>]*>", "", row)).replace("Photo Wall", f"\u2068{name}\u2069")
+
+
+def question(language, **subject):
+    """What the alert says in that language, as the sample application would cause it."""
     with tempfile.NamedTemporaryFile(suffix=".mo") as file:
         subprocess.run(["msgfmt", "-o", file.name, PROJECT / f"Resources/{language}.po"], check=True)
         table = gettext.GNUTranslations(open(file.name, "rb")).gettext
-    name = NAMES.get(language, "Photos")
+    name = subject.get("name", NAMES.get(language, "Photos"))
     return {
         "title": table("ACCOUNT_ACCESS_REQUEST_TITLE"),
-        "message": table("ACCOUNT_ACCESS_BASIC_MESSAGE").replace("%@", f"\u2068{name}\u2069"),
+        "message": sentence(language, name),
         "allow": table("ACCOUNT_ACCESS_ALLOW_BUTTON_TITLE"),
         "refuse": table("ACCOUNT_ACCESS_DO_NOT_ALLOW_BUTTON_TITLE"),
         "languages": language,
-        "subject": {"name": name, "id": "org.example.photos", "identity": "certain", "account": "ada@example.org"},
+        "subject": {"name": name, "id": "org.example.photos", "identity": "certain", "account": "ada@example.org", **subject},
     }
 
 
@@ -47,30 +61,46 @@ def window_of(pid):
 def take(window, name):
     time.sleep(SETTLED_AFTER)
     subprocess.run(["import", "-frame", "-window", window, FOLDER / f"{name}.png"], check=True)
-    print(f"{FOLDER / name}.png")
 
 
-def picture(name, question, environment=None):
-    with Alert(str(HELPER), question, {"GTK_THEME": "Adwaita", **(environment or {})}) as alert:
+def picture(name, asked, theme="Adwaita", **environment):
+    with Alert(str(HELPER), asked, {"GTK_THEME": theme, **environment}) as alert:
         take(window_of(alert.process.pid), name)
 
 
-def picture_of_terminal(name):
+def picture_of_terminal(name, language):
+    """A session in which the sample application asks. It makes a file when the question stands."""
     command = f"'{PROJECT}/Tools/Trial/session' '{BUILD}' 2>/dev/null"
-    xterm = ["xterm", "-fa", "Noto Sans Mono", "-fs", "11", "-geometry", "100x18", "-bg", "white", "-fg", "black", "-T", "Terminal"]
-    with subprocess.Popen([*xterm, "-e", "bash", "-c", command], stderr=subprocess.DEVNULL) as terminal:
+    look = ["-fa", "DejaVu Sans Mono", "-fd", "Noto Sans Mono CJK JP", "-fs", "11", "-bg", "white", "-fg", "black", "-xrm",
+            "XTerm*forceBoxChars: true"]
+    xterm = ["xterm", "-u8", *look, "-geometry", "84x18", "-T", "Terminal", "-e", "bash", "-c", command]
+    with subprocess.Popen(xterm, env=os.environ | {"LANGUAGE": language}, stderr=subprocess.DEVNULL) as terminal:
         window = window_of(terminal.pid)
-        time.sleep(8)
+        time.sleep(6)
         take(window, name)
         terminal.terminate()
 
 
-picture("alert-light", texts("en"))
-picture("alert-dark", texts("en"), {"GTK_THEME": "Adwaita:dark"})
-claimed = texts("en")
-claimed["subject"] = {"name": "photos", "id": "/home/ada/bin/photos", "identity": "claimed", "account": "ada@example.org"}
-picture("alert-claimed", claimed)
-picture("alert-arabic", texts("ar"))
-picture("alert-japanese", texts("ja"))
-picture("alert-doubled", texts("en"), {"GDK_SCALE": "2"})
-picture_of_terminal("alert-terminal")
+def pictures_on_x11():
+    english = question("en")
+    picture("alert-light", english)
+    picture("alert-dark", english, theme="Adwaita:dark")
+    picture("alert-doubled", english, GDK_SCALE="2")
+    picture("alert-claimed", question("en", name="photos", id="/home/ada/bin/photos", identity="claimed"))
+    picture("alert-arabic", question("ar"))
+    picture("alert-japanese", question("ja"))
+    picture_of_terminal("alert-terminal", "en")
+    picture_of_terminal("alert-terminal-japanese", "ja")
+
+
+def pictures_on_wayland():
+    with Alert(str(HELPER), question("en"), {"GTK_THEME": "Adwaita"}):
+        time.sleep(LONGEST_WAIT / 4)
+        picture_file = FOLDER / "alert-wayland.png"
+        subprocess.run(["grim", picture_file], check=True)
+        # The window with a margin of what is below it.
+        subprocess.run(["convert", picture_file, "-fuzz", "2%", "-trim", "-bordercolor", "#323232", "-border", "36", picture_file],
+                       check=True)
+
+
+{"x11": pictures_on_x11, "wayland": pictures_on_wayland}[sys.argv[1]]()
