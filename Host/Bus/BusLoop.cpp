@@ -38,10 +38,9 @@ void BusLoop::run() {
 }
 
 void BusLoop::stop() {
-  {
-    const std::lock_guard lock(_mutex);
-    _isStopping = true;
-  }
+  // All of it under the lock: as soon as that is free, `run` may return and the loop be gone.
+  const std::lock_guard lock(_mutex);
+  _isStopping = true;
   _leadIsFree.notify_all();
   wake();
 }
