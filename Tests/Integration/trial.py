@@ -13,9 +13,9 @@ import sqlite3
 import subprocess
 import sys
 import tempfile
+import termios
 import threading
 import time
-import tty
 
 from accounts import NAME, Caller
 from bus_wire import MEMBER
@@ -76,10 +76,11 @@ class Person:
         self.answer = answer
         self.alerts = 0
         self._changed = threading.Condition()
-        self._screen, terminal = pty.openpty()
-        tty.setraw(terminal)
-        self._terminal = terminal
-        self.path = os.ttyname(terminal)
+        self._screen, self._terminal = pty.openpty()
+        settings = termios.tcgetattr(self._terminal)
+        settings[3] &= ~termios.ECHO
+        termios.tcsetattr(self._terminal, termios.TCSANOW, settings)
+        self.path = os.ttyname(self._terminal)
         self._leave, self._left = os.pipe()
         self._thread = threading.Thread(target=self._watch, daemon=True)
         self._thread.start()
@@ -101,9 +102,13 @@ class Person:
     def _watch(self) -> None:
         seen = ""
         while True:
-            readable, _, _ = select.select([self._screen, self._leave], [], [])
+            # An alert that stands on has not taken the key: it came too early.
+            readable, _, _ = select.select([self._screen, self._leave], [], [], self.READING_TIME if self._hesitates() else None)
             if self._leave in readable:
                 return
+            if not readable:
+                self.press(self.KEYS[self.answer])
+                continue
             seen += os.read(self._screen, 1 << 16).decode(errors="replace")
             # A dialog that is drawn again, for another button, begins without the empty line.
             while (whole := re.search(r"\r\n(?:\x1b\[[0-9;]*[A-Za-z])*┌.*?┘", seen, re.DOTALL)):
@@ -114,9 +119,12 @@ class Person:
         with self._changed:
             self.alerts += 1
             self._changed.notify_all()
-        if self.answer == "allow":
-            select.select([self._leave], [], [], self.READING_TIME)
-        os.write(self._screen, self.KEYS[self.answer])
+        if self.answer != "allow":
+            self.press(self.KEYS[self.answer])
+
+    def _hesitates(self) -> bool:
+        """Whether there is an alert to allow: while one stands, the terminal gives key by key."""
+        return self.answer == "allow" and not termios.tcgetattr(self._terminal)[3] & termios.ICANON
 
 
 class Trial:
