@@ -82,7 +82,12 @@ SecretServiceSession::SecretServiceSession(std::chrono::milliseconds timeLimit)
     : _timeLimit(timeLimit),
       _context(g_main_context_new()) {}
 
-SecretServiceSession::~SecretServiceSession() = default;
+SecretServiceSession::~SecretServiceSession() {
+  _service.reset();
+  // What the service let go of is given back by the context's next round.
+  while (g_main_context_iteration(_context.get(), FALSE) != FALSE) {
+  }
+}
 
 void SecretServiceSession::run(const std::string& during, const Work& work) {
   const std::unique_lock lock(_mutex, _timeLimit);
