@@ -22,6 +22,12 @@ namespace {
 
 using testing::Each;
 
+#if defined __SANITIZE_ADDRESS__ || defined __SANITIZE_THREAD__
+constexpr bool isSanitized = true;
+#else
+constexpr bool isSanitized = false;
+#endif
+
 // What the program prints: how many pieces of a secret that it has given back are in its memory.
 int piecesLeftBy(const std::string& program) {
   const std::unique_ptr<FILE, int (*)(FILE*)> output(popen(program.c_str(), "r"), pclose);
@@ -30,9 +36,16 @@ int piecesLeftBy(const std::string& program) {
   return pieces;
 }
 
-TEST(ASecretThatWasGivenBack, IsNowhereInTheProcess) { EXPECT_EQ(piecesLeftBy(CANARY_PROGRAM), 0); }
+class ASecretThatWasGivenBack : public testing::Test {
+ protected:
+  void SetUp() override {
+    if (isSanitized) GTEST_SKIP() << "a sanitizer's memory is too large to search, and keeps what lay on the stack";
+  }
+};
 
-TEST(ASecretThatWasGivenBack, IsFoundWithoutTheWipingOperators) { EXPECT_GT(piecesLeftBy(CANARY_PROGRAM_WITHOUT_WIPING), 0); }
+TEST_F(ASecretThatWasGivenBack, IsNowhereInTheProcess) { EXPECT_EQ(piecesLeftBy(CANARY_PROGRAM), 0); }
+
+TEST_F(ASecretThatWasGivenBack, IsFoundWithoutTheWipingOperators) { EXPECT_GT(piecesLeftBy(CANARY_PROGRAM_WITHOUT_WIPING), 0); }
 
 TEST(Wiping, LeavesZerosInMemory) {
   std::array<char, 8> memory{'s', 'e', 'c', 'r', 'e', 't', '!', '!'};
