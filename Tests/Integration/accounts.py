@@ -3,7 +3,7 @@
 import itertools
 import os
 
-from bus_wire import MEMBER, PATH, SIGNAL, BusError, Connection, Message, socket_of
+from bus_wire import MEMBER, PATH, PATIENCE, SIGNAL, BusError, Connection, Message, socket_of
 
 FACEBOOK = "com.veltran.accounttype.facebook"
 NAME = "com.veltran.Accounts1"
@@ -79,18 +79,18 @@ class Request:
         self.path = f"{OBJECT}/request/{caller.name[1:].replace('.', '_')}/{token}"
         self.is_answered = False
 
-    def reply(self, timeout: float = 20) -> tuple[int, dict]:
+    def reply(self, timeout: float = PATIENCE) -> tuple[int, dict]:
         """The word of the reply and its results."""
         _, word, results = self._caller.reply_to(self._serial, timeout).answer()
         self.is_answered = word != PENDING
         return word, results
 
-    def outcome(self, timeout: float = 20) -> tuple[int, dict]:
+    def outcome(self, timeout: float = PATIENCE) -> tuple[int, dict]:
         """The word that the request comes to in the end, and its results."""
         word, results = self.reply(timeout)
         return (word, results) if self.is_answered else self.response(timeout)
 
-    def response(self, timeout: float = 20) -> tuple[int, dict]:
+    def response(self, timeout: float = PATIENCE) -> tuple[int, dict]:
         """What the Response signal brings. A caller that listens learns here that the daemon has ended."""
         message = self._caller.wait_for(self._ends_with, timeout)
         if message.fields[MEMBER] == "NameOwnerChanged":

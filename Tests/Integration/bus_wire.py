@@ -11,6 +11,12 @@ import socket
 import struct
 import time
 
+# Whether the daemons run under a sanitizer, and how many times slower everything is then.
+IS_SANITIZED = any(name.endswith("SAN_OPTIONS") for name in os.environ)
+SLOWNESS = 5 if IS_SANITIZED else 1
+# How many seconds may pass until what must come has come.
+PATIENCE = 20 * SLOWNESS
+
 CALL, REPLY, ERROR, SIGNAL = 1, 2, 3, 4
 PATH, INTERFACE, MEMBER, ERROR_NAME, REPLY_SERIAL, DESTINATION, SENDER, SIGNATURE, DESCRIPTORS = range(1, 10)
 FIELD_TYPES = {PATH: "o", INTERFACE: "s", MEMBER: "s", ERROR_NAME: "s", REPLY_SERIAL: "u", DESTINATION: "s", SENDER: "s",
@@ -202,18 +208,18 @@ class Connection:
         return self._serial
 
     def call(self, destination: str, path: str, interface: str, member: str, signature: str = "", values=(), *,
-             timeout: float = 20, **more) -> list:
+             timeout: float = PATIENCE, **more) -> list:
         serial = self.send(destination, path, interface, member, signature, values, **more)
         return self.reply_to(serial, timeout).answer()
 
-    def reply_to(self, serial: int, timeout: float = 20) -> Message:
+    def reply_to(self, serial: int, timeout: float = PATIENCE) -> Message:
         return self.wait_for(lambda message: message.fields.get(REPLY_SERIAL) == serial, timeout)
 
-    def signal(self, member: str, path: str | None = None, timeout: float = 20) -> Message:
+    def signal(self, member: str, path: str | None = None, timeout: float = PATIENCE) -> Message:
         return self.wait_for(lambda message: message.kind == SIGNAL and message.fields[MEMBER] == member and
                              path in (None, message.fields[PATH]), timeout)
 
-    def wait_for(self, is_meant, timeout: float = 20) -> Message:
+    def wait_for(self, is_meant, timeout: float = PATIENCE) -> Message:
         """Takes the first message that is meant out of the inbox, when it has come."""
         deadline = time.monotonic() + timeout
         while True:

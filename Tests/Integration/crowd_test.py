@@ -9,6 +9,7 @@ import sys
 import unittest
 
 import trial
+from bus_wire import IS_SANITIZED, SLOWNESS
 from trial import THIS_PROGRAM, wait_until
 
 trial.use_build_of_command_line()
@@ -41,7 +42,7 @@ class Crowd:
         preamble = "import sys; from accounts import Caller; caller = Caller(sys.argv[1]); "
         process = self._session.start(self._session.root / "bin" / name, "-c", preamble + script, self._session.bus,
                                       environment=self._environment, stdout=subprocess.PIPE)
-        return process.communicate(timeout=30)[0].decode().strip()
+        return process.communicate(timeout=30 * SLOWNESS)[0].decode().strip()
 
     def ask(self) -> list[dict]:
         """Has all of them ask at once; what each application found."""
@@ -62,7 +63,7 @@ class Crowd:
             return [json.loads(line) for line in lines]
         finally:
             for application in crowd:
-                application.communicate(timeout=60)
+                application.communicate(timeout=60 * SLOWNESS)
 
 
 class AThousandConnections(unittest.TestCase):
@@ -78,7 +79,9 @@ class AThousandConnections(unittest.TestCase):
         self.expect_right_answers(crowd.ask())
         rest = self.memory()
         self.expect_right_answers(crowd.ask())
-        self.assertLess(self.memory(), rest + TOLERATED_GROWTH_KB, "kB that the daemon has taken for good")
+        # A sanitizer keeps what was freed, to see who still uses it.
+        if not IS_SANITIZED:
+            self.assertLess(self.memory(), rest + TOLERATED_GROWTH_KB, "kB that the daemon has taken for good")
         if os.geteuid() == 0:
             wait_until(lambda: self.descriptors() < 64, "the daemon lets go of its descriptors")
 

@@ -276,11 +276,11 @@ class AnAdditionOfAnAccountThatIsCutOff(unittest.TestCase):
                     except BusError as error:
                         self.assertEqual(error.name, "NoReply")
                 call = kill_points.fatal_call()
+                kill_points.arm(0)
                 if not call:
                     break
                 points += 1
                 session.accountd.wait()
-                kill_points.arm(0)
                 session.start_accountd(environment=kill_points.environment)
                 with self.subTest(f"killed before call {points}, {call}"), session.caller() as caller:
                     caller.listen()

@@ -18,10 +18,11 @@ import threading
 import time
 
 from accounts import NAME, Caller
-from bus_wire import MEMBER
+from bus_wire import MEMBER, PATIENCE
 
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
 BUILD = PROJECT / "build/debug"
+DAEMONS = ("accountd", "vantad")
 # The program that this is: what the daemon takes a caller in this process for.
 THIS_PROGRAM = os.path.realpath("/proc/self/exe")
 
@@ -55,7 +56,7 @@ def use_build_of_command_line() -> None:
         BUILD = pathlib.Path(sys.argv.pop(1)).resolve()
 
 
-def wait_until(is_true, what: str, timeout: float = 20):
+def wait_until(is_true, what: str, timeout: float = PATIENCE):
     """Asks again and again for what nobody announces."""
     deadline = time.monotonic() + timeout
     while not (result := is_true()):
@@ -91,7 +92,7 @@ class Person:
         for descriptor in (self._screen, self._terminal, self._leave, self._left):
             os.close(descriptor)
 
-    def wait_for_alert(self, number: int, timeout: float = 20) -> None:
+    def wait_for_alert(self, number: int, timeout: float = PATIENCE) -> None:
         with self._changed:
             if not self._changed.wait_for(lambda: self.alerts >= number, timeout):
                 raise TimeoutError(f"{self.alerts} alerts came instead of {number}.")
@@ -163,6 +164,8 @@ class Trial:
         self.close()
 
     def close(self) -> None:
+        """Ends everything. A daemon that does not end as it should has failed its test."""
+        problems = self._end_daemons()
         for process in reversed(self._processes):
             if process.poll() is None:
                 process.kill()
@@ -172,6 +175,22 @@ class Trial:
                     stream.close()
         self.person.leave()
         shutil.rmtree(self.root, ignore_errors=True)
+        if problems:
+            raise RuntimeError("\n".join(problems))
+
+    def _end_daemons(self) -> list[str]:
+        """Tells the daemons that still run to end; what was wrong with how they did."""
+        daemons = [process for process in self._processes if process.args[0] in DAEMONS and process.poll() is None]
+        for daemon in daemons:
+            daemon.terminate()
+        problems = []
+        for daemon in daemons:
+            name = daemon.args[0]
+            with contextlib.suppress(subprocess.TimeoutExpired):
+                daemon.wait(PATIENCE)
+            if daemon.poll() != 0:
+                problems.append(f"{name}, told to end, ended with {daemon.returncode}: {self._log_of(name)}")
+        return problems
 
     def start(self, *command, **more) -> subprocess.Popen:
         process = subprocess.Popen([str(word) for word in command], env=self.environment | more.pop("environment", {}),
@@ -241,10 +260,14 @@ class Trial:
 
     def kill_accountd(self) -> None:
         self.accountd.send_signal(signal.SIGKILL)
-        self.accountd.wait()
+        if self.accountd.wait() != -signal.SIGKILL:
+            raise RuntimeError(f"accountd had ended with {self.accountd.returncode}: {self.daemon_log()}")
 
     def daemon_log(self) -> str:
-        return (self.root / "accountd.log").read_text(encoding="utf-8", errors="replace")
+        return self._log_of("accountd")
+
+    def _log_of(self, daemon: str) -> str:
+        return (self.root / f"{daemon}.log").read_text(encoding="utf-8", errors="replace")
 
     def caller(self) -> Caller:
         return Caller(self.bus)
