@@ -6,9 +6,12 @@
 #include <csignal>
 #include <exception>
 #include <iostream>
+#include <memory>
+#include <mutex>
 #include <thread>
 
 #include "Host/Daemon/AccountDaemon.h"
+#include "Host/Daemon/AtEnd.h"
 #include "Host/Daemon/Paths.h"
 #include "Host/Http/Environment.h"
 #include "Host/Preferences/TomlFile.h"
@@ -30,13 +33,23 @@ sigset_t blockEndingSignals() {
   return signals;
 }
 
+// The daemon that a signal stops, or null when it is going away by itself: a session that ends takes the bus away and sends the
+// signal, in any order.
+struct Serving {
+  std::mutex mutex;
+  AccountDaemon* daemon = nullptr;
+};
+
 // Work that waits for a server may take minutes more. What is stored is safe at every moment, so the process does not wait for
 // it.
-void stopWhenSignalled(AccountDaemon& daemon, sigset_t signals) {
-  std::thread([&daemon, signals] {
+void stopWhenSignalled(const std::shared_ptr<Serving>& serving, sigset_t signals) {
+  std::thread([serving, signals] {
     int signal = 0;
     sigwait(&signals, &signal);
-    daemon.stop();
+    {
+      const std::lock_guard lock(serving->mutex);
+      if (serving->daemon != nullptr) serving->daemon->stop();
+    }
     std::this_thread::sleep_for(longestFarewell);
     _exit(0);
   }).detach();
@@ -50,7 +63,13 @@ std::filesystem::path installedPlugins() {
 int serve(const palisade::DaemonConfiguration& configuration) {
   const sigset_t signals = blockEndingSignals();
   AccountDaemon daemon(configuration);
-  stopWhenSignalled(daemon, signals);
+  const auto serving = std::make_shared<Serving>();
+  serving->daemon = &daemon;
+  const palisade::AtEnd leave([&] {
+    const std::lock_guard lock(serving->mutex);
+    serving->daemon = nullptr;
+  });
+  stopWhenSignalled(serving, signals);
   daemon.run();
   return 0;
 }

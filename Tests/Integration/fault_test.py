@@ -7,11 +7,12 @@ import os
 import pathlib
 import resource
 import subprocess
+import time
 import unittest
 
 import trial
 from accounts import FACEBOOK, GRANTED, PENDING, REFUSED
-from bus_wire import BusError
+from bus_wire import PATIENCE, BusError
 from trial import wait_until
 
 trial.use_build_of_command_line()
@@ -299,6 +300,16 @@ class SeveralDaemons(unittest.TestCase):
                 self.assertIn(b"Another account daemon serves this session already.", daemon.stderr.read())
             with session.caller() as caller:
                 self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+
+
+class ASessionThatEnds(unittest.TestCase):
+    def test_takes_the_daemon_along_whether_the_bus_or_the_signal_comes_first(self):
+        for moment in range(8):
+            with self.subTest(moment=moment), trial.trial_with_account(log="error") as session:
+                session.bus_process.kill()
+                time.sleep(moment / 400)
+                session.accountd.terminate()
+                self.assertIn(session.accountd.wait(PATIENCE), (0, 1), session.daemon_log())
 
 
 class ADaemonWithFewDescriptors(unittest.TestCase):
