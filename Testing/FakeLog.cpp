@@ -17,7 +17,7 @@ void FakeLog::write(const LogRecord& record) {
   // Rendering asks clients and accounts for their descriptions; that is the log's doing, not the plug-in's.
   const FaultInjector::Pause pause;
   Array arguments;
-  for (const LogArgument& argument : record.arguments) arguments.push_back(describe(argument));
+  for (const LogArgument& argument : record.arguments) arguments.emplace_back(describe(argument));
   _instruments.trace.record("log", {{"level", static_cast<int>(record.level)},
                                     {"operationName", record.place.operationName},
                                     {"format", record.format},

@@ -74,9 +74,10 @@ ScenarioProcess::ScenarioProcess(const std::string& text, const CarryOut& carryO
   _output = ends[0];
   if (child > 0) _process = pidfd_open(child, 0);
   if (_process >= 0) return;
-  const std::system_error error = failure("cannot start a process for a scenario");
+  const int reason = errno;
   close(_output);
-  throw error;
+  errno = reason;
+  throw failure("cannot start a process for a scenario");
 }
 
 ScenarioProcess::~ScenarioProcess() {
