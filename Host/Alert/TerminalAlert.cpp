@@ -9,12 +9,12 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <limits>
 #include <span>
 #include <string_view>
 #include <utility>
 
 #include "Host/Alert/AskedQuestion.h"
+#include "Host/Alert/Deadline.h"
 #include "Host/Alert/TerminalDialog.h"
 #include "Host/Files/FileDescriptor.h"
 
@@ -69,13 +69,6 @@ Key keyOf(std::string_view input) {
   return Key::none;
 }
 
-// For poll(2): -1 waits for ever.
-int millisecondsUntil(Clock::time_point deadline) {
-  if (deadline == Clock::time_point::max()) return -1;
-  const auto remaining = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now()).count();
-  return static_cast<int>(std::clamp<decltype(remaining)>(remaining, 0, std::numeric_limits<int>::max()));
-}
-
 class TerminalAlertHandle final : public AlertHandle {
  public:
   TerminalAlertHandle(FileDescriptor terminal, FileDescriptor takenDown, AlertQuestion question)
@@ -95,7 +88,7 @@ class TerminalAlertHandle final : public AlertHandle {
 
   void takeDown() const { eventfd_write(_takenDown.number(), 1); }
 
-  AlertResponse waitForAnswer(std::chrono::milliseconds armedAfter, Clock::time_point deadline) {
+  AlertResponse waitForAnswer(std::chrono::milliseconds armedAfter, Deadline deadline) {
     Clock::time_point armedAt = Clock::now() + armedAfter;
     char buffer[64];
     while (true) {
@@ -132,11 +125,11 @@ class TerminalAlertHandle final : public AlertHandle {
   }
 
   // Waits for keys; 0 when there will be no answer: taken down, out of time, or the terminal is gone.
-  std::size_t readKeys(std::span<char> buffer, Clock::time_point deadline) const {
+  std::size_t readKeys(std::span<char> buffer, Deadline deadline) const {
     while (true) {
       pollfd sources[] = {{.fd = _terminal.number(), .events = POLLIN, .revents = 0},
                           {.fd = _takenDown.number(), .events = POLLIN, .revents = 0}};
-      const int ready = poll(sources, std::size(sources), millisecondsUntil(deadline));
+      const int ready = poll(sources, std::size(sources), millisecondsLeft(deadline));
       if (ready < 0 && errno == EINTR) continue;
       if (ready <= 0 || sources[1].revents != 0) return 0;
 
@@ -178,10 +171,7 @@ int TerminalAlert::receiveResponse(const std::shared_ptr<AlertHandle>& handle, d
   response = AlertResponseNobody;
   const auto alert = own(handle);
   if (alert == nullptr) return EINVAL;
-  const auto deadline = timeoutSeconds > 0
-                            ? Clock::now() + std::chrono::ceil<Clock::duration>(std::chrono::duration<double>(timeoutSeconds))
-                            : Clock::time_point::max();
-  response = alert->waitForAnswer(_options.armedAfter, deadline);
+  response = alert->waitForAnswer(_options.armedAfter, deadlineAfter(timeoutSeconds));
   return 0;
 }
 
