@@ -117,9 +117,10 @@ std::size_t placeOfNewLine(const toml::table& table, std::string_view content) {
 std::string edit(std::string content, const toml::table& table, const std::string& key, const std::string& line) {
   const auto entry = table.find(key);
   if (entry == table.end()) {
+    if (line.empty()) return content;
     std::size_t place = placeOfNewLine(table, content);
     if (place > 0 && content[place - 1] != '\n') content.insert(place++, "\n");
-    return content.insert(place, line.empty() ? line : line + "\n");
+    return content.insert(place, line + "\n");
   }
   const std::size_t begin = offsetOf(entry->first.source().begin, content);
   std::size_t end = offsetOf(entry->second.source().end, content);

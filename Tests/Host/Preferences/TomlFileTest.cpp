@@ -112,7 +112,7 @@ TEST_F(TomlFile, KeepsWhatIsWrittenAroundAValueThatIsSet) {
       {"a new value where there are tables only", "# of the window\n[window]\nwidth = 3\n", 1,
        "size = 1\n# of the window\n[window]\nwidth = 3\n"},
       {"a value that goes", "# mine\nsize = 1  # in points\nfont = 'serif'", std::nullopt, "# mine\nfont = 'serif'"},
-      {"a value that was not there", "# mine\n", std::nullopt, "# mine\n"},
+      {"a value that was not there", "# mine", std::nullopt, "# mine"},
       {"another table's value of that name", "# mine\n[window]\nsize = 1\n", 2, "size = 2\n# mine\n[window]\nsize = 1\n"},
       {"a date beside it", "size = 1\nday = 2026-11-22\n", 2, "size = 2\nday = 2026-11-22\n"},
       {"an inline table", "size = { width = 3 } # mine\n", 1, "size = 1 # mine\n"},
