@@ -115,6 +115,8 @@ class AccountOperations final : public AccountsService {
   std::map<Operation*, Running> _running;
   /// How many tokens each connection is sending.
   std::map<std::string, std::size_t> _tokenTransfers;
+  /// Held by the addition of an account, from the look for one of its name until it has its token.
+  std::mutex _addition;
 };
 
 }  // namespace palisade

@@ -82,6 +82,8 @@ std::string AccountOperations::addAccount(const BusCaller& caller, const std::st
   if (token.empty() || token.size() > longestToken) {
     throw BusFailure(BusFailureKind::invalidArguments, "An account needs a token of at most 64 KiB.");
   }
+  // One at a time: an account that another addition is giving its token would look like one that was cut off.
+  const std::lock_guard addition(_addition);
   const auto accounts = storeCall([&] { return _parts.store.accounts(); });
   const auto found = std::ranges::find_if(accounts, [&](const AccountRecord& other) {
     return other.accountTypeIdentifier == accountType && other.username == username;

@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
 """Callers that mean no good, or no sense: what they send is refused with a sentence, and harms nobody else."""
 
+import concurrent.futures
 import os
 import time
 import unittest
@@ -222,6 +223,21 @@ class Floods(HostileCallers):
                 self.caller.reply_to(serial).answer()
             self.assertIn("did not come to its end", refused.exception.message)
         self.assertEqual(len(self.caller.manage("ListAccounts", "s", [""])[0]), 1)
+
+    def test_of_additions_of_one_account_add_it_once(self):
+        def add(name: str) -> bool:
+            with self.session.caller() as caller:
+                try:
+                    caller.add_account(name, self.session.master_token)
+                except BusError as error:
+                    self.assertIn("already", str(error))
+                    return False
+                return True
+
+        with concurrent.futures.ThreadPoolExecutor(LONGEST_LANE) as pool:
+            for name in (f"user {number}" for number in range(20)):
+                with self.subTest(name=name):
+                    self.assertEqual(sum(pool.map(add, [name] * LONGEST_LANE)), 1)
 
 
 class Leaving(HostileCallers):
