@@ -11,6 +11,7 @@
 #include "Host/Json/Json.h"
 #include "Sandbox/FaultyAnswer.h"
 #include "Sandbox/Form.h"
+#include "Sandbox/TlsServer.h"
 
 namespace palisade::sandbox {
 namespace {
@@ -70,7 +71,7 @@ std::string wholeAnswer(const Answer& answer) {
 
 std::unique_ptr<httplib::Server> makeServer(const Authority& authority, CertificateKind kind) {
   auto server = kind == CertificateKind::plain ? std::make_unique<httplib::Server>()
-                                               : std::make_unique<httplib::SSLServer>([&authority, kind](SSL_CTX& context) {
+                                               : std::make_unique<TlsServer>([&authority, kind](SSL_CTX& context) {
                                                    authority.prepare(context, kind);
                                                    return true;
                                                  });

@@ -1,7 +1,8 @@
 #pragma once
 
 /// The sandbox's two listeners on the loopback interface: the Facebook server, which can be told to fail, and the control
-/// server, which tells it to and never fails itself. The HTTP library occurs here and in ControlClient only.
+/// server, which tells it to and never fails itself. The HTTP library occurs here, in TlsServer and in ControlClient
+/// only.
 ///
 /// Threads: made on the main thread; each listener serves from threads of its own until the process ends. Ownership: borrows
 /// what it serves. Errors: `std::runtime_error` when a port cannot be had.
