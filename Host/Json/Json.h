@@ -52,8 +52,11 @@ class NlohmannJsonParser final : public JsonParser {
   NullCharacters _nullCharacters;
 };
 
-/// The value as compact JSON on one line. Bytes that are not UTF-8 become U+FFFD, numbers that are not finite become null. What
-/// it writes reads back as an equal value, unless the value holds one of those or U+0000 or is nested too deep for the parser.
+/// The value as compact JSON on one line. Bytes that are not UTF-8 become U+FFFD, numbers that are not finite become null.
 std::string writeJson(const Value& value);
+
+/// Whether a parser that accepts `maximumDepth` levels reads what `writeJson` writes as an equal value: that holds no bytes
+/// that are not UTF-8, no number that is not finite, no U+0000, and no level more.
+bool survivesJson(const Value& value, std::size_t maximumDepth);
 
 }  // namespace palisade

@@ -3,8 +3,12 @@
 /// Writing: the library writes the scalars; arrays and objects are walked here, without recursion, because a value may be
 /// nested deeper than the library's own writer survives.
 
+#include <algorithm>
+#include <cmath>
 #include <nlohmann/json.hpp>
 #include <vector>
+
+#include "Host/Json/JsonText.h"
 
 namespace palisade {
 namespace {
@@ -70,8 +74,25 @@ class Writer {
   std::vector<Level> _open;
 };
 
+bool survives(std::string_view text) {
+  return text.find('\0') == std::string_view::npos && positionOfInvalidUtf8(text) == text.size();
+}
+
 }  // namespace
 
 std::string writeJson(const Value& value) { return Writer().write(value); }
+
+bool survivesJson(const Value& value, std::size_t maximumDepth) {
+  if (const std::string* text = value.string()) return survives(*text);
+  if (const double* real = value.real()) return std::isfinite(*real);
+  if (value.array() == nullptr && value.dictionary() == nullptr) return true;
+  if (maximumDepth == 0) return false;
+  if (const Array* array = value.array()) {
+    return std::ranges::all_of(*array, [&](const Value& element) { return survivesJson(element, maximumDepth - 1); });
+  }
+  return std::ranges::all_of(*value.dictionary(), [&](const Dictionary::Entry& entry) {
+    return survives(entry.first) && survivesJson(entry.second, maximumDepth - 1);
+  });
+}
 
 }  // namespace palisade

@@ -42,12 +42,11 @@ std::string secretTextOfCredential(const std::shared_ptr<Account>& account, cons
   if (credential->oauthToken()) content.set(tokenKey, *credential->oauthToken());
   content.set(refreshTokenKey, credential->refreshToken());
   content.set(expiryDateKey, std::int64_t{credential->expiryDate().time_since_epoch().count()});
-  std::string text = writeJson(content);
-  if (read(text) != content) {
+  if (!survivesJson(content, 1)) {
     throw KeychainError(KeychainErrorNotRepresentable,
                         "cannot store " + describe(entry) + ": a token is not UTF-8 or holds U+0000");
   }
-  return text;
+  return writeJson(content);
 }
 
 std::shared_ptr<const AccountCredential> credentialInSecretText(std::string_view text, const KeychainEntry& entry) {

@@ -106,6 +106,26 @@ TEST(WrittenJson, OfTheDeepestValueReadsBack) {
   EXPECT_EQ(writeJson(*parser.parse(text, JsonFragments::refused).value), text);
 }
 
+TEST(WrittenJson, IsKnownToLoseWhatItLoses) {
+  constexpr std::size_t depth = 3;
+  const NlohmannJsonParser parser(depth);
+  const Value lost[] = {"\xFF",
+                        std::string("a\0b", 3),
+                        std::numeric_limits<double>::infinity(),
+                        std::nan(""),
+                        Dictionary{{"\xC0", 1}},
+                        Dictionary{{std::string("\0", 1), 1}},
+                        Array{Dictionary{{"name", Array{"\xED"}}}},
+                        Array{Array{Array{Array{}}}},
+                        Dictionary{{"1", Dictionary{{"2", Dictionary{{"3", Array{}}}}}}}};
+  for (const Value& value : lost) {
+    SCOPED_TRACE(writeJson(value));
+    EXPECT_NE(parser.parse(writeJson(value), JsonFragments::allowed).value, value);
+    EXPECT_FALSE(survivesJson(value, depth));
+  }
+  EXPECT_TRUE(survivesJson(Array{Array{Array{"\u20AC", 0.1, nullptr}}}, depth));
+}
+
 TEST(WrittenJson, ReadsBackAsTheSameValueInTheSameOrder) {
   RandomValues values(20251121);
   const NlohmannJsonParser parser;
@@ -116,5 +136,6 @@ TEST(WrittenJson, ReadsBackAsTheSameValueInTheSameOrder) {
     ASSERT_EQ(result.error, std::nullopt) << text;
     ASSERT_THAT(result.value, Optional(value)) << text;
     ASSERT_EQ(writeJson(*result.value), text);
+    ASSERT_TRUE(survivesJson(value, 5)) << text;
   }
 }
