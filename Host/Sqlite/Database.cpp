@@ -83,6 +83,8 @@ std::unique_ptr<Database> Database::openExisting(const StoreOptions& options) {
   return database;
 }
 
+Database::~Database() = default;
+
 std::unique_ptr<Database> Database::openReader() const {
   return std::unique_ptr<Database>(new Database(_path, SQLITE_OPEN_READONLY, _busyTimeout));
 }
@@ -148,6 +150,16 @@ void Database::check() {
   if (!finding.next()) throw SqliteError(StoreErrorDamaged, _path, "check the store", "the check found nothing to read");
   const std::string verdict = finding.text(0);
   if (verdict != "ok") throw SqliteError(StoreErrorDamaged, _path, "check the store", verdict);
+}
+
+const Statement& Database::beginning() {
+  if (_beginning == nullptr) _beginning = std::make_unique<const Statement>(*this, "begin a change", "BEGIN IMMEDIATE");
+  return *_beginning;
+}
+
+const Statement& Database::ending() {
+  if (_ending == nullptr) _ending = std::make_unique<const Statement>(*this, "store a change", "COMMIT");
+  return *_ending;
 }
 
 void Database::execute(std::string_view during, const char* sql) {

@@ -26,6 +26,8 @@ struct sqlite3;
 
 namespace palisade {
 
+class Statement;
+
 enum class DamagedStore {
   refuse,     ///< opening a damaged store, or one that was set aside before, fails
   startFresh  ///< an empty store takes its place; the damaged one stays beside it
@@ -49,6 +51,8 @@ class Database {
   /// Opens the store for reading and writing; makes it when there has never been one.
   static std::unique_ptr<Database> open(const StoreOptions& options);
 
+  ~Database();
+
   /// Another connection to the same file, for reading only.
   std::unique_ptr<Database> openReader() const;
 
@@ -63,7 +67,9 @@ class Database {
   /// Runs SQL that has no arguments and no rows. `during` completes "cannot ...".
   void execute(std::string_view during, const char* sql);
 
-  /// For this folder: the library's connection, and its last error as an exception.
+  /// For this folder: the two ends of a transaction, the library's connection, and its last error as an exception.
+  const Statement& beginning();
+  const Statement& ending();
   sqlite3* connection() const { return _connection.get(); }
   SqliteError failure(int resultCode, std::string_view during) const;
 
@@ -87,6 +93,8 @@ class Database {
   std::chrono::milliseconds _busyTimeout;
   std::optional<std::filesystem::path> _setAside;
   std::unique_ptr<sqlite3, Closer> _connection;
+  std::unique_ptr<const Statement> _beginning;
+  std::unique_ptr<const Statement> _ending;
 };
 
 }  // namespace palisade

@@ -3,10 +3,11 @@
 #include <sqlite3.h>
 
 #include "Host/Sqlite/Database.h"
+#include "Host/Sqlite/Statement.h"
 
 namespace palisade {
 
-Transaction::Transaction(Database& database) : _database(database) { _database.execute("begin a change", "BEGIN IMMEDIATE"); }
+Transaction::Transaction(Database& database) : _database(database) { _database.beginning().execute(); }
 
 // The library has rolled back by itself after some errors; a second time does no harm, and there is nobody to tell.
 Transaction::~Transaction() {
@@ -14,7 +15,7 @@ Transaction::~Transaction() {
 }
 
 void Transaction::commit() {
-  _database.execute("store a change", "COMMIT");
+  _database.ending().execute();
   _isOpen = false;
 }
 
