@@ -65,7 +65,8 @@ std::filesystem::path alertHelper() { return std::filesystem::read_symlink("/pro
 
 std::string alertLanguages() {
   std::string languages;
-  for (const std::string& language : preferredCatalogues(std::nullopt)) languages += (languages.empty() ? "" : ":") + language;
+  for (const std::string& language : preferredCatalogues(environmentLanguages()))
+    languages += (languages.empty() ? "" : ":") + language;
   return languages;
 }
 

@@ -3,6 +3,7 @@
 #include <map>
 #include <mutex>
 #include <utility>
+#include <vector>
 
 #include "Host/Strings/LanguagePreference.h"
 #include "Host/Strings/MessageCatalogue.h"
@@ -22,6 +23,16 @@ class GettextStringTable::Catalogues {
  public:
   explicit Catalogues(std::filesystem::path folder) : _folder(std::move(folder)) {}
 
+  /// Those for a list of languages, best first. A look-up asks anew; the names are made again when the list has changed.
+  std::shared_ptr<const std::vector<std::string>> preferred(std::string languages) {
+    const std::lock_guard guard(_mutex);
+    if (_preferred == nullptr || languages != _languages) {
+      _preferred = std::make_shared<const std::vector<std::string>>(preferredCatalogues(languages));
+      _languages = std::move(languages);
+    }
+    return _preferred;
+  }
+
   /// Lives as long as this object.
   const CatalogueTexts& find(const std::string& catalogue, std::string_view table) {
     const std::lock_guard guard(_mutex);
@@ -37,8 +48,10 @@ class GettextStringTable::Catalogues {
 
  private:
   const std::filesystem::path _folder;
-  std::mutex _mutex;
-  std::map<std::string, std::map<std::string, CatalogueTexts>, std::less<>> _read;  // guarded by _mutex; by table, catalogue
+  std::mutex _mutex;  // guards what follows
+  std::string _languages;
+  std::shared_ptr<const std::vector<std::string>> _preferred;
+  std::map<std::string, std::map<std::string, CatalogueTexts>, std::less<>> _read;  // by table, catalogue
 };
 
 GettextStringTable::GettextStringTable(std::filesystem::path resourcesFolder, std::optional<std::string> fixedLanguage)
@@ -50,7 +63,8 @@ GettextStringTable::~GettextStringTable() = default;
 std::string GettextStringTable::localizedString(std::string_view key, std::string_view defaultValue,
                                                 std::string_view tableName) const {
   if (canBeLookedUp(key, tableName)) {
-    for (const std::string& catalogue : preferredCatalogues(_fixedLanguage)) {
+    const auto preferred = _catalogues->preferred(_fixedLanguage ? *_fixedLanguage : environmentLanguages());
+    for (const std::string& catalogue : *preferred) {
       const CatalogueTexts& texts = _catalogues->find(catalogue, tableName);
       const auto text = texts.find(key);
       if (text != texts.end() && !text->second.empty()) return text->second;

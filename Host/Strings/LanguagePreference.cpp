@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <optional>
 
 namespace palisade {
 namespace {
@@ -72,16 +73,15 @@ std::vector<std::string> chineseCatalogues(const Language& chinese) {
   return {common, "zh"};
 }
 
-// The names of the languages in the environment: the first variable that says something decides.
-std::vector<std::string_view> environmentLanguages() {
-  if (const char* list = std::getenv("LANGUAGE"); list != nullptr && *list != '\0') return split(list, ":");
-  for (const char* variable : {"LC_ALL", "LC_MESSAGES", "LANG"}) {
-    if (const char* name = std::getenv(variable); name != nullptr && *name != '\0') return {name};
+}  // namespace
+
+// The first variable that says something decides.
+std::string environmentLanguages() {
+  for (const char* variable : {"LANGUAGE", "LC_ALL", "LC_MESSAGES", "LANG"}) {
+    if (const char* languages = std::getenv(variable); languages != nullptr && *languages != '\0') return languages;
   }
   return {};
 }
-
-}  // namespace
 
 std::vector<std::string> cataloguesForLanguage(std::string_view name) {
   const std::string_view bare = name.substr(0, name.find_first_of(".@"));
@@ -95,16 +95,14 @@ std::vector<std::string> cataloguesForLanguage(std::string_view name) {
   return {code + "_" + language->region, code};
 }
 
-std::vector<std::string> preferredCatalogues(const std::optional<std::string>& fixedLanguage) {
+std::vector<std::string> preferredCatalogues(std::string_view languages) {
   std::vector<std::string> preferred;
   const auto append = [&preferred](const std::vector<std::string>& catalogues) {
     for (const std::string& catalogue : catalogues) {
       if (std::find(preferred.begin(), preferred.end(), catalogue) == preferred.end()) preferred.push_back(catalogue);
     }
   };
-  const std::vector<std::string_view> names =
-      fixedLanguage ? std::vector<std::string_view>{*fixedLanguage} : environmentLanguages();
-  for (const std::string_view name : names) append(cataloguesForLanguage(name));
+  for (const std::string_view language : split(languages, ":")) append(cataloguesForLanguage(language));
   append({english});
   return preferred;
 }

@@ -5,7 +5,6 @@
 /// Threads: safe from every thread, as long as nobody changes the environment at that moment. Ownership: results are values.
 /// Errors: none. What is no language name is passed over.
 
-#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -16,8 +15,10 @@ namespace palisade {
 /// and zh, "C" gives en. Empty for anything else that is no such name, so a result never leads out of the folder.
 std::vector<std::string> cataloguesForLanguage(std::string_view name);
 
-/// The catalogues to look into, best first, each once, English last: those of `fixedLanguage`, otherwise those that the
-/// environment names at this moment.
-std::vector<std::string> preferredCatalogues(const std::optional<std::string>& fixedLanguage);
+/// The languages that the environment names at this moment, divided by colons.
+std::string environmentLanguages();
+
+/// The catalogues to look into for a list of languages, best first, each once, English last.
+std::vector<std::string> preferredCatalogues(std::string_view languages);
 
 }  // namespace palisade
