@@ -16,6 +16,9 @@
 namespace palisade {
 namespace {
 
+constexpr long smallestUploadBuffer = 16 * 1024;  // the library takes no less
+constexpr long receiveBuffer = 4 * 1024;
+
 constexpr auto authoritiesAreKept = std::chrono::hours(1);
 
 // No socket is inherited by the programs that a daemon starts.
@@ -94,6 +97,9 @@ void CurlTransfer::setLimits() {
   // The library holds this against what a server announces only; `takeBody` counts what comes.
   set(CURLOPT_MAXFILESIZE_LARGE, static_cast<curl_off_t>(_options.bodyLimit));
   set(CURLOPT_NOSIGNAL, 1L);
+  // What is sent and what comes are small, and every buffer is wiped when it is freed.
+  set(CURLOPT_UPLOAD_BUFFERSIZE, smallestUploadBuffer);
+  set(CURLOPT_BUFFERSIZE, receiveBuffer);
   // A name server that stays silent must not hold up the other transfers when this one ends.
   set(CURLOPT_QUICK_EXIT, 1L);
 }

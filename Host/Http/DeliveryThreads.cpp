@@ -13,10 +13,15 @@ void DeliveryThreads::start() {
 }
 
 void DeliveryThreads::deliver(std::function<void()> work) {
-  const std::lock_guard lock(_mutex);
-  _work.push_back(std::move(work));
+  {
+    const std::lock_guard lock(_mutex);
+    _work.push_back(std::move(work));
+    if (_work.size() > _idle && _threads.size() < mostThreads) startAnother();
+  }
   _changed.notify_one();
-  if (_work.size() <= _idle || _threads.size() == mostThreads) return;
+}
+
+void DeliveryThreads::startAnother() {
   try {
     _threads.push_back(startQuietThread("http-answers", [this] { run(); }));
   } catch (const std::system_error&) {

@@ -33,6 +33,7 @@ class DeliveryThreads {
  private:
   static constexpr std::size_t mostThreads = 8;
 
+  void startAnother();
   void run();
 
   std::mutex _mutex;

@@ -18,7 +18,7 @@ constexpr int untilSomethingHappens = 3'600'000;  // milliseconds; the library w
 }  // namespace
 
 std::uint64_t TransferThread::start(HttpRequest request, HttpHandler handler) {
-  const std::lock_guard lock(_mutex);
+  std::unique_lock lock(_mutex);
   const std::uint64_t number = ++_lastNumber;
   _delivery.start();
   try {
@@ -28,6 +28,7 @@ std::uint64_t TransferThread::start(HttpRequest request, HttpHandler handler) {
     return number;
   }
   _ordered.push_back({.number = number, .request = std::move(request), .handler = std::move(handler)});
+  lock.unlock();
   _curl->multiWakeUp(_multi);
   return number;
 }
@@ -121,8 +122,8 @@ void TransferThread::settleFinished() {
 void TransferThread::settle(std::uint64_t number, HttpResult result) {
   const auto transfer = _transfers.find(number);
   if (transfer == _transfers.end()) return;
-  _curl->multiRemove(_multi, transfer->second.carried->handle());
   deliver(std::move(transfer->second.handler), std::move(result));
+  _curl->multiRemove(_multi, transfer->second.carried->handle());
   _transfers.erase(transfer);
 }
 
