@@ -59,7 +59,7 @@ AccountRecord SqliteAccountStore::addAccount(std::string_view accountTypeIdentif
                         .accountTypeIdentifier = std::string(accountTypeIdentifier),
                         .username = std::string(username),
                         .description = std::string(description)};
-  account.id = _connections->write([&](Database&, const AccountStoreWriter& writer) {
+  account.id = _connections->writeBehind(_connections->accountsOfType, [&](Database&, const AccountStoreWriter& writer) {
     Statement::Run row = writer.addAccount.run(accountTypeIdentifier, username, description);
     row.next();
     std::string id = row.text(0);
@@ -72,8 +72,8 @@ AccountRecord SqliteAccountStore::addAccount(std::string_view accountTypeIdentif
 }
 
 bool SqliteAccountStore::removeAccount(std::string_view id) {
-  const auto accountTypeIdentifier =
-      _connections->write([&](Database&, const AccountStoreWriter& writer) -> std::optional<std::string> {
+  const auto accountTypeIdentifier = _connections->writeBehind(
+      _connections->accountsOfType, [&](Database&, const AccountStoreWriter& writer) -> std::optional<std::string> {
         Statement::Run row = writer.removeAccount.run(id);
         if (!row.next()) return std::nullopt;
         std::string identifier = row.text(0);

@@ -12,16 +12,11 @@ std::optional<Error> SqliteAccountStore::appendToHistory(std::span<const History
   try {
     _connections->write([&](Database& database, const AccountStoreWriter& writer) {
       Transaction transaction(database);
-      std::int64_t last = 0;
       for (const HistoryEntry& entry : entries) {
-        Statement::Run row =
-            writer.appendToHistory.run(entry.at.time_since_epoch().count(), entry.accountTypeIdentifier, entry.bundleID,
+        writer.appendToHistory.execute(entry.at.time_since_epoch().count(), entry.accountTypeIdentifier, entry.bundleID,
                                        entry.granted, entry.userPrompted, entry.elapsedSeconds);
-        row.next();
-        last = row.integer(0);
-        row.next();
       }
-      writer.trimHistory.execute(last - historyCapacity);
+      writer.trimHistory.execute(historyCapacity);
       transaction.commit();
     });
   } catch (const SqliteError& error) {

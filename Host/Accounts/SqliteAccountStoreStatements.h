@@ -38,8 +38,9 @@ struct AccountStoreWriter {
                                  "DELETE FROM authorizations WHERE answered_by_nobody = 1"),
         appendToHistory(database, "write the history",
                         "INSERT INTO history (at, account_type, bundle_id, granted, user_prompted, elapsed_seconds)"
-                        " VALUES (?1, ?2, ?3, ?4, ?5, ?6) RETURNING position"),
-        trimHistory(database, "shorten the history", "DELETE FROM history WHERE position <= ?1") {}
+                        " VALUES (?1, ?2, ?3, ?4, ?5, ?6)"),
+        trimHistory(database, "shorten the history",
+                    "DELETE FROM history WHERE position <= (SELECT max(position) FROM history) - ?1") {}
 
   Statement addAccount;
   Statement removeAccount;
@@ -95,16 +96,13 @@ struct SqliteAccountStore::Store : Connections<AccountStoreWriter, AccountStoreR
   using Connections::Connections;
 
   // A write that fails may have been stored all the same.
-  template <typename Work>
-  auto write(Work work) {
+  template <typename Cache, typename Work>
+  auto writeBehind(Cache& kept, Work work) {
     struct ForgetAtEnd {
-      Store& store;
-      ~ForgetAtEnd() {
-        store.accountsOfType.forget();
-        store.authorizations.forget();
-      }
-    } const forgetAtEnd{*this};
-    return Connections::write(work);
+      Cache& kept;
+      ~ForgetAtEnd() { kept.forget(); }
+    } const forgetAtEnd{kept};
+    return write(work);
   }
 
   ReadCache<std::vector<AccountRecord>> accountsOfType;
@@ -119,7 +117,7 @@ inline std::string keyOf(std::string_view accountTypeIdentifier, std::string_vie
 template <typename Work>
 std::optional<Error> SqliteAccountStore::_change(const StoreChange& change, Work work) {
   try {
-    _connections->write(work);
+    _connections->writeBehind(_connections->authorizations, work);
   } catch (const SqliteError& error) {
     return error.error();
   }
