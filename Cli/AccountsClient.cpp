@@ -59,12 +59,6 @@ auto checked(const Call& call) {
   }
 }
 
-Rows rowsFromBus(const std::vector<BusDictionary>& busRows) {
-  Rows rows;
-  for (const BusDictionary& row : busRows) rows.push_back(dictionaryFromBus(row));
-  return rows;
-}
-
 std::string randomToken() {
   std::random_device random;
   return "palisade" + std::to_string(random()) + "_" + std::to_string(random());
@@ -121,18 +115,16 @@ class AccountsClient::Bus {
     std::optional<AccessAnswer> answer;
 
     const auto request = sdbus::createProxy(*_connection, busName, path);
-    request->uponSignal("Response")
-        .onInterface(requestInterface)
-        .call([&](std::uint32_t response, const BusDictionary& results) {
-          const std::lock_guard lock(mutex);
-          answer = AccessAnswer{static_cast<AccessAnswer::Response>(response), dictionaryFromBus(results)};
-          hasAnswer.notify_one();
-        });
+    request->uponSignal("Response").onInterface(requestInterface).call([&](std::uint32_t response, const Dictionary& results) {
+      const std::lock_guard lock(mutex);
+      answer = AccessAnswer{static_cast<AccessAnswer::Response>(response), results};
+      hasAnswer.notify_one();
+    });
     request->finishRegistration();
 
     const auto [requestPath, response, results] = call(BusDictionary{{"handle_token", token}});
     const auto first = static_cast<AccessAnswer::Response>(response);
-    if (first != AccessAnswer::Response::pending) return {first, dictionaryFromBus(results)};
+    if (first != AccessAnswer::Response::pending) return {first, results};
     whenPending();
     std::unique_lock lock(mutex);
     while (!answer) {
@@ -187,7 +179,7 @@ std::string AccountsClient::credential(const std::string& accountType) {
 }
 
 Rows AccountsClient::listAccounts(const std::string& accountType) {
-  return checked([&] { return rowsFromBus(_bus->manager().ListAccounts(accountType, {})); });
+  return checked([&] { return _bus->manager().ListAccounts(accountType, {}); });
 }
 
 std::string AccountsClient::addAccount(const std::string& accountType, const std::string& username, const std::string& token) {
@@ -210,7 +202,7 @@ void AccountsClient::removeAccount(const std::string& id) {
 }
 
 Rows AccountsClient::listGrants(const std::string& accountType) {
-  return checked([&] { return rowsFromBus(_bus->manager().ListGrants(accountType, {})); });
+  return checked([&] { return _bus->manager().ListGrants(accountType, {}); });
 }
 
 void AccountsClient::revoke(const std::string& accountType, const std::string& client) {
@@ -224,19 +216,19 @@ void AccountsClient::revokeAll(const std::string& accountType) {
 Rows AccountsClient::history(std::uint32_t limit, const std::optional<std::string>& client) {
   BusDictionary options{{"limit", limit}};
   if (client) options.emplace("client", *client);
-  return checked([&] { return rowsFromBus(_bus->manager().History(options)); });
+  return checked([&] { return _bus->manager().History(options); });
 }
 
 Rows AccountsClient::listRevocations() {
-  return checked([&] { return rowsFromBus(_bus->manager().ListRevocations({})); });
+  return checked([&] { return _bus->manager().ListRevocations({}); });
 }
 
 Rows AccountsClient::listClients() {
-  return checked([&] { return rowsFromBus(_bus->manager().ListClients({})); });
+  return checked([&] { return _bus->manager().ListClients({}); });
 }
 
 std::optional<Value> AccountsClient::preference(const std::string& domain, const std::string& key) {
-  const Dictionary found = checked([&] { return dictionaryFromBus(_bus->manager().GetPreference(domain, key, {})); });
+  const Dictionary found = checked([&] { return _bus->manager().GetPreference(domain, key, {}); });
   const Value* value = found.find("value");
   return value == nullptr ? std::nullopt : std::optional(*value);
 }
@@ -246,7 +238,7 @@ void AccountsClient::setPreference(const std::string& domain, const std::string&
 }
 
 Dictionary AccountsClient::status() {
-  return checked([&] { return dictionaryFromBus(_bus->manager().GetStatus({})); });
+  return checked([&] { return _bus->manager().GetStatus({}); });
 }
 
 ServiceState AccountsClient::serviceState(const std::string& name) {

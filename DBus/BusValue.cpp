@@ -3,42 +3,12 @@
 #include <sdbus-c++/sdbus-c++.h>
 
 #include <cstdint>
+#include <optional>
+#include <utility>
 #include <vector>
 
 namespace palisade {
 namespace {
-
-template <typename BusType, typename PlatformType = BusType>
-bool convertBasic(const sdbus::Variant& variant, Value& value) {
-  if (!variant.containsValueOfType<BusType>()) return false;
-  value = Value(static_cast<PlatformType>(variant.get<BusType>()));
-  return true;
-}
-
-template <typename BusType, typename PlatformType = BusType>
-bool convertArray(const sdbus::Variant& variant, Value& value) {
-  if (!variant.containsValueOfType<std::vector<BusType>>()) return false;
-  Array array;
-  for (const auto& element : variant.get<std::vector<BusType>>()) array.emplace_back(static_cast<PlatformType>(element));
-  value = std::move(array);
-  return true;
-}
-
-template <typename BusType, typename PlatformType = BusType>
-bool convertBasicOrArray(const sdbus::Variant& variant, Value& value) {
-  return convertBasic<BusType, PlatformType>(variant, value) || convertArray<BusType, PlatformType>(variant, value);
-}
-
-template <typename BusType, typename PlatformType = BusType>
-bool convertDictionary(const sdbus::Variant& variant, Value& value) {
-  if (!variant.containsValueOfType<std::map<std::string, BusType>>()) return false;
-  Dictionary dictionary;
-  for (const auto& [key, entry] : variant.get<std::map<std::string, BusType>>()) {
-    dictionary.set(key, static_cast<PlatformType>(entry));
-  }
-  value = std::move(dictionary);
-  return true;
-}
 
 sdbus::Variant variantFromValue(const Value& value);
 
@@ -65,37 +35,84 @@ sdbus::Variant variantFromValue(const Value& value) {
   return std::string();
 }
 
-}  // namespace
-
-Value valueFromBus(const sdbus::Variant& variant, const std::string& name) {
-  Value value;
-  if (convertBasicOrArray<std::string>(variant, value) || convertBasicOrArray<bool>(variant, value) ||
-      convertBasicOrArray<std::uint8_t, std::int64_t>(variant, value) ||
-      convertBasicOrArray<std::int16_t, std::int64_t>(variant, value) ||
-      convertBasicOrArray<std::uint16_t, std::int64_t>(variant, value) ||
-      convertBasicOrArray<std::int32_t, std::int64_t>(variant, value) ||
-      convertBasicOrArray<std::uint32_t, std::int64_t>(variant, value) || convertBasicOrArray<std::int64_t>(variant, value) ||
-      convertBasicOrArray<std::uint64_t>(variant, value) || convertBasicOrArray<double>(variant, value) ||
-      convertBasicOrArray<sdbus::ObjectPath, std::string>(variant, value) ||
-      convertBasicOrArray<sdbus::Signature, std::string>(variant, value) || convertDictionary<std::string>(variant, value) ||
-      convertDictionary<bool>(variant, value) || convertDictionary<std::int64_t>(variant, value)) {
-    return value;
-  }
-  if (variant.containsValueOfType<sdbus::Variant>()) return valueFromBus(variant.get<sdbus::Variant>(), name);
-  if (variant.containsValueOfType<BusDictionary>()) return dictionaryFromBus(variant.get<BusDictionary>());
-  if (variant.containsValueOfType<std::vector<sdbus::Variant>>()) {
-    Array array;
-    for (const auto& element : variant.get<std::vector<sdbus::Variant>>()) array.push_back(valueFromBus(element, name));
-    return array;
-  }
-  throw UnsuitableType("'" + name + "' has the type '" + variant.peekValueType() +
-                       "', which has no meaning here. Use strings, numbers, booleans, and arrays or dictionaries of variants.");
+template <typename BusType, typename PlatformType = BusType>
+Value read(sdbus::Message& message) {
+  BusType content{};
+  message >> content;
+  return static_cast<PlatformType>(std::move(content));
 }
 
-Dictionary dictionaryFromBus(const BusDictionary& entries) {
+std::optional<Value> readNext(sdbus::Message& message, const std::string& key);
+
+Value readVariant(sdbus::Message& message, const std::string& contents, const std::string& key) {
+  message.enterVariant(contents);
+  Value content = *readNext(message, key);
+  message.exitVariant();
+  return content;
+}
+
+// `entry` is the signature of one entry, without its braces.
+Dictionary readDictionary(sdbus::Message& message, const std::string& entry) {
   Dictionary dictionary;
-  for (const auto& [key, variant] : entries) dictionary.set(key, valueFromBus(variant, key));
+  // At the end of an array of dictionaries the message says so.
+  if (!message.enterContainer('{' + entry + '}')) return dictionary;
+  while (message.enterDictEntry(entry)) {
+    std::string key;
+    message >> key;
+    Value value = *readNext(message, key);
+    dictionary.set(std::move(key), std::move(value));
+    message.exitDictEntry();
+  }
+  message.clearFlags();
+  message.exitContainer();
   return dictionary;
+}
+
+Array readArray(sdbus::Message& message, const std::string& element, const std::string& key) {
+  Array array;
+  message.enterContainer(element);
+  while (auto next = readNext(message, key)) array.push_back(*std::move(next));
+  message.exitContainer();
+  return array;
+}
+
+// None at the end of an array.
+std::optional<Value> readNext(sdbus::Message& message, const std::string& key) {
+  std::string type;
+  std::string contents;
+  message.peekType(type, contents);
+  switch (type.front()) {
+    case '\0': return std::nullopt;
+    case 's': return read<std::string>(message);
+    case 'o': return read<sdbus::ObjectPath, std::string>(message);
+    case 'g': return read<sdbus::Signature, std::string>(message);
+    case 'b': return read<bool>(message);
+    case 'y': return read<std::uint8_t, std::int64_t>(message);
+    case 'n': return read<std::int16_t, std::int64_t>(message);
+    case 'q': return read<std::uint16_t, std::int64_t>(message);
+    case 'i': return read<std::int32_t, std::int64_t>(message);
+    case 'u': return read<std::uint32_t, std::int64_t>(message);
+    case 'x': return read<std::int64_t>(message);
+    case 't': return read<std::uint64_t>(message);
+    case 'd': return read<double>(message);
+    case 'v': return readVariant(message, contents, key);
+    case 'a':
+      if (contents.starts_with("{s")) return readDictionary(message, contents.substr(1, contents.size() - 2));
+      if (!contents.starts_with('{')) return readArray(message, contents, key);
+      break;
+    default: break;
+  }
+  const std::string signature = type == "r" ? '(' + contents + ')' : type + contents;
+  throw UnsuitableType(
+      "'" + key + "' holds a value of the type '" + signature +
+      "', which has no meaning here. Use strings, numbers, booleans, arrays, and dictionaries with strings for keys.");
+}
+
+}  // namespace
+
+sdbus::Message& operator>>(sdbus::Message& message, Dictionary& dictionary) {
+  dictionary = readDictionary(message, "sv");
+  return message;
 }
 
 BusDictionary dictionaryToBus(const Dictionary& dictionary) {

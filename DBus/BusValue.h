@@ -1,33 +1,41 @@
 #pragma once
 
-/// Values between D-Bus and the platform.
+/// Values between D-Bus and the platform. What is received is read out of its message straight into a `Dictionary`: the bus
+/// library's own variants are messages each, which costs more than all the rest of a call. What is sent is made of them.
 ///
 /// Every basic D-Bus type has a place: the smaller integers become integers, object paths and signatures strings. Arrays and
-/// dictionaries with string keys are converted with all that they hold, nested as deep as D-Bus allows.
+/// dictionaries with string keys are converted with all that they hold, nested as deep as D-Bus allows; a variant is what it
+/// holds.
 /// Threads: pure functions. Errors: `UnsuitableType` for a type that has no place, such as a file descriptor.
 
+#include <sdbus-c++/Error.h>
+#include <sdbus-c++/Message.h>
+#include <sdbus-c++/TypeTraits.h>
 #include <sdbus-c++/Types.h>
 
 #include <map>
-#include <stdexcept>
 #include <string>
 
 #include "Platform/Value.h"
 
 namespace palisade {
 
-/// `what()` says which entry has which type, and which types have a meaning.
-class UnsuitableType : public std::invalid_argument {
+/// Says which entry holds which type, and which types have a meaning. The bus carries it to a caller as it is.
+class UnsuitableType : public sdbus::Error {
  public:
-  using std::invalid_argument::invalid_argument;
+  explicit UnsuitableType(const std::string& message) : Error("com.veltran.Accounts1.Error.InvalidArguments", message) {}
 };
 
 using BusDictionary = std::map<std::string, sdbus::Variant>;
 
-Value valueFromBus(const sdbus::Variant& variant, const std::string& name);
-Dictionary dictionaryFromBus(const BusDictionary& entries);
+/// Reads a{sv}.
+sdbus::Message& operator>>(sdbus::Message& message, Dictionary& dictionary);
 
 /// A null value has no place on the bus: such entries are left out.
 BusDictionary dictionaryToBus(const Dictionary& dictionary);
 
 }  // namespace palisade
+
+/// Has the bus library's templates take a `Dictionary` for a{sv}.
+template <>
+struct sdbus::signature_of<palisade::Dictionary> : sdbus::signature_of<palisade::BusDictionary> {};

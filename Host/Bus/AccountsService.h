@@ -12,6 +12,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <memory>
 #include <optional>
 #include <stdexcept>
 #include <string>
@@ -80,8 +81,8 @@ class AccountsService {
  public:
   virtual ~AccountsService() = default;
 
-  virtual AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType, const Dictionary& accessOptions,
-                                      PendingRequest& request) = 0;
+  virtual AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType,
+                                      const std::shared_ptr<const Dictionary>& accessOptions, PendingRequest& request) = 0;
   virtual AccessOutcome authorize(const BusCaller& caller, const std::string& accountType, const std::string& client,
                                   PendingRequest& request) = 0;
   virtual std::string credential(const BusCaller& caller, const std::string& accountType) = 0;

@@ -33,7 +33,7 @@ BusRows rowsToBus(const Rows& rows) {
   return converted;
 }
 
-void refuseUnknownOptions(const BusDictionary& options, std::initializer_list<std::string_view> known) {
+void refuseUnknownOptions(const Dictionary& options, std::initializer_list<std::string_view> known) {
   for (const auto& [key, value] : options) {
     if (std::find(known.begin(), known.end(), key) == known.end()) {
       throw BusFailure(BusFailureKind::invalidArguments, "There is no option '" + key + "'.");
@@ -41,24 +41,23 @@ void refuseUnknownOptions(const BusDictionary& options, std::initializer_list<st
   }
 }
 
-Dictionary requestedOptions(const BusDictionary& options) {
-  try {
-    return dictionaryFromBus(options);
-  } catch (const UnsuitableType& unsuitable) {
-    throw BusFailure(BusFailureKind::invalidArguments, unsuitable.what());
+std::optional<std::string> textOption(const Dictionary& options, std::string_view key) {
+  const Value* option = options.find(key);
+  if (option == nullptr) return std::nullopt;
+  if (option->string() == nullptr) {
+    throw BusFailure(BusFailureKind::invalidArguments, "The option '" + std::string(key) + "' must be a string.");
   }
+  return *option->string();
 }
 
-template <typename Type>
-std::optional<Type> optionOf(const BusDictionary& options, const std::string& key) {
-  const auto option = options.find(key);
-  if (option == options.end()) return std::nullopt;
-  if (!option->second.containsValueOfType<Type>()) {
-    throw BusFailure(BusFailureKind::invalidArguments, "The option '" + key + "' has the type '" +
-                                                           option->second.peekValueType() + "' instead of '" +
-                                                           sdbus::signature_of<Type>::str() + "'.");
+std::optional<std::uint32_t> numberOption(const Dictionary& options, std::string_view key) {
+  const Value* option = options.find(key);
+  if (option == nullptr) return std::nullopt;
+  if (option->integer() == nullptr || !std::in_range<std::uint32_t>(*option->integer())) {
+    throw BusFailure(BusFailureKind::invalidArguments,
+                     "The option '" + std::string(key) + "' must be a whole number from 0 to 4294967295.");
   }
-  return option->second.get<Type>();
+  return static_cast<std::uint32_t>(*option->integer());
 }
 
 // Whoever sends a token has it; a descriptor that stays silent is not waited for.
@@ -160,94 +159,94 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
  private:
-  void RequestAccess(AccessResult&& result, std::string accountType, BusDictionary accessOptions,
-                     BusDictionary options) override {
+  void RequestAccess(AccessResult&& result, std::string accountType, Dictionary accessOptions, Dictionary options) override {
     startRequest(std::move(result), options,
-                 [this, accountType, accessOptions](const BusCaller& caller, PendingRequest& request) {
-                   return _service.requestAccess(caller, accountType, requestedOptions(accessOptions), request);
+                 [this, accountType = std::move(accountType),
+                  accessOptions = std::make_shared<const Dictionary>(std::move(accessOptions))](
+                     const BusCaller& caller, PendingRequest& request) {
+                   return _service.requestAccess(caller, accountType, accessOptions, request);
                  });
   }
 
-  void Authorize(AccessResult&& result, std::string accountType, std::string client, BusDictionary options) override {
+  void Authorize(AccessResult&& result, std::string accountType, std::string client, Dictionary options) override {
     startRequest(std::move(result), options, [this, accountType, client](const BusCaller& caller, PendingRequest& request) {
       return _service.authorize(caller, accountType, client, request);
     });
   }
 
-  void GetCredential(sdbus::Result<std::string>&& result, std::string accountType, BusDictionary options) override {
+  void GetCredential(sdbus::Result<std::string>&& result, std::string accountType, Dictionary options) override {
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { return _service.credential(caller, accountType); });
   }
 
-  void GetCredentialDescriptor(sdbus::Result<sdbus::UnixFd>&& result, std::string accountType, BusDictionary options) override {
+  void GetCredentialDescriptor(sdbus::Result<sdbus::UnixFd>&& result, std::string accountType, Dictionary options) override {
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { return pipeHolding(_service.credential(caller, accountType)); });
   }
 
-  void ListAccounts(sdbus::Result<BusRows>&& result, std::string accountType, BusDictionary options) override {
+  void ListAccounts(sdbus::Result<BusRows>&& result, std::string accountType, Dictionary options) override {
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { return rowsToBus(_service.listAccounts(caller, accountType)); });
   }
 
   void AddAccount(sdbus::Result<std::string>&& result, std::string accountType, std::string username, sdbus::UnixFd token,
-                  BusDictionary options) override {
+                  Dictionary options) override {
     start(std::move(result), options, {}, [this, accountType, username, token](const BusCaller& caller) {
       return _service.addAccount(caller, accountType, username, [&token] { return readToEnd(token); });
     });
   }
 
-  void RemoveAccount(sdbus::Result<>&& result, std::string id, BusDictionary options) override {
+  void RemoveAccount(sdbus::Result<>&& result, std::string id, Dictionary options) override {
     start(std::move(result), options, {}, [this, id](const BusCaller& caller) { _service.removeAccount(caller, id); });
   }
 
-  void ListGrants(sdbus::Result<BusRows>&& result, std::string accountType, BusDictionary options) override {
+  void ListGrants(sdbus::Result<BusRows>&& result, std::string accountType, Dictionary options) override {
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { return rowsToBus(_service.listGrants(caller, accountType)); });
   }
 
-  void Revoke(sdbus::Result<>&& result, std::string accountType, std::string client, BusDictionary options) override {
+  void Revoke(sdbus::Result<>&& result, std::string accountType, std::string client, Dictionary options) override {
     start(std::move(result), options, {},
           [this, accountType, client](const BusCaller& caller) { _service.revoke(caller, accountType, client); });
   }
 
-  void RevokeAll(sdbus::Result<>&& result, std::string accountType, BusDictionary options) override {
+  void RevokeAll(sdbus::Result<>&& result, std::string accountType, Dictionary options) override {
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { _service.revokeAll(caller, accountType); });
   }
 
-  void History(sdbus::Result<BusRows>&& result, BusDictionary options) override {
+  void History(sdbus::Result<BusRows>&& result, Dictionary options) override {
     start(std::move(result), options, {"limit", "client"}, [this, options](const BusCaller& caller) {
-      return rowsToBus(_service.history(caller, optionOf<std::uint32_t>(options, "limit").value_or(100),
-                                        optionOf<std::string>(options, "client")));
+      return rowsToBus(_service.history(caller, numberOption(options, "limit").value_or(100),
+                                        textOption(options, "client")));
     });
   }
 
-  void ListRevocations(sdbus::Result<BusRows>&& result, BusDictionary options) override {
+  void ListRevocations(sdbus::Result<BusRows>&& result, Dictionary options) override {
     start(std::move(result), options, {},
           [this](const BusCaller& caller) { return rowsToBus(_service.listRevocations(caller)); });
   }
 
-  void ListClients(sdbus::Result<BusRows>&& result, BusDictionary options) override {
+  void ListClients(sdbus::Result<BusRows>&& result, Dictionary options) override {
     start(std::move(result), options, {}, [this](const BusCaller& caller) { return rowsToBus(_service.listClients(caller)); });
   }
 
   void GetPreference(sdbus::Result<BusDictionary>&& result, std::string domain, std::string key,
-                     BusDictionary options) override {
+                     Dictionary options) override {
     start(std::move(result), options, {}, [this, domain, key](const BusCaller& caller) {
       const auto value = _service.preference(caller, domain, key);
       return value ? dictionaryToBus({{"value", *value}}) : BusDictionary();
     });
   }
 
-  void SetPreference(sdbus::Result<>&& result, std::string domain, std::string key, BusDictionary options) override {
+  void SetPreference(sdbus::Result<>&& result, std::string domain, std::string key, Dictionary options) override {
     start(std::move(result), options, {"value"}, [this, domain, key, options](const BusCaller& caller) {
-      const Dictionary given = requestedOptions(options);
-      const Value* value = given.find("value");
+      const Value* value = options.find("value");
       _service.setPreference(caller, domain, key, value == nullptr ? std::nullopt : std::optional(*value));
     });
   }
 
-  void GetStatus(sdbus::Result<BusDictionary>&& result, BusDictionary options) override {
+  void GetStatus(sdbus::Result<BusDictionary>&& result, Dictionary options) override {
     start(std::move(result), options, {}, [this](const BusCaller& caller) { return dictionaryToBus(_service.status(caller)); });
   }
 
@@ -266,7 +265,7 @@ class BusServer::Implementation final : private OwnedConnection,
   // Calls are carried out when their message handler has returned: the library holds its lock while one runs. A handler answers
   // only what is wrong with the message itself.
   template <typename Result, typename Work>
-  void start(Result&& result, const BusDictionary& options, std::initializer_list<std::string_view> known, Work work) {
+  void start(Result&& result, const Dictionary& options, std::initializer_list<std::string_view> known, Work work) {
     checked([&] {
       refuseUnknownOptions(options, known);
       const auto reply = std::make_shared<Result>(std::forward<Result>(result));
@@ -276,12 +275,12 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
   template <typename Work>
-  void startRequest(AccessResult&& result, const BusDictionary& options, Work work) {
+  void startRequest(AccessResult&& result, const Dictionary& options, Work work) {
     checked([&] {
       refuseUnknownOptions(options, {"handle_token"});
       const auto caller = callerOfThisMessage();
       const auto request = std::make_shared<BusRequest>(_requests, caller->uniqueName,
-                                                        optionOf<std::string>(options, "handle_token"), std::move(result));
+                                                        textOption(options, "handle_token"), std::move(result));
       BusLoop::defer(
           [request, caller, work = std::move(work)] { carryOut(*request, [&] { return work(*caller, *request); }); });
     });

@@ -21,12 +21,12 @@ std::optional<std::string> textUnder(const Dictionary& options, std::string_view
 }  // namespace
 
 AccessOutcome AccountOperations::requestAccess(const BusCaller& caller, const std::string& accountType,
-                                               const Dictionary& accessOptions, PendingRequest& request) {
+                                               const std::shared_ptr<const Dictionary>& accessOptions,
+                                               PendingRequest& request) {
   const auto client = clientOf(caller);
-  const auto options = std::make_shared<const Dictionary>(accessOptions);
-  return carryOut(caller, client, accountType, textUnder(accessOptions, FacebookAppIdKey), request,
+  return carryOut(caller, client, accountType, textUnder(*accessOptions, FacebookAppIdKey), request,
                   [&](auto& plugin, const auto& type, const auto& store, auto completion) {
-                    plugin.handleAccessRequestToAccountsOfType(type, client, options, store, true, std::move(completion));
+                    plugin.handleAccessRequestToAccountsOfType(type, client, accessOptions, store, true, std::move(completion));
                   });
 }
 

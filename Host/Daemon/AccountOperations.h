@@ -48,8 +48,8 @@ class AccountOperations final : public AccountsService {
 
   explicit AccountOperations(Parts parts) : _parts(std::move(parts)), _lanes(longestLane) {}
 
-  AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType, const Dictionary& accessOptions,
-                              PendingRequest& request) override;
+  AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType,
+                              const std::shared_ptr<const Dictionary>& accessOptions, PendingRequest& request) override;
   AccessOutcome authorize(const BusCaller& caller, const std::string& accountType, const std::string& client,
                           PendingRequest& request) override;
   std::string credential(const BusCaller& caller, const std::string& accountType) override;

@@ -87,12 +87,17 @@ class Messages(HostileCallers):
 
     def test_with_options_of_wrong_types_are_refused(self):
         for method, signature, values, sentence in (
-                ("History", "a{sv}", [{"limit": ("s", "1")}], "'limit' has the type 's' instead of 'u'"),
-                ("History", "a{sv}", [{"client": ("ay", b"x")}], "'client' has the type 'ay' instead of 's'"),
+                ("History", "a{sv}", [{"limit": ("s", "1")}], "'limit' must be a whole number"),
+                ("History", "a{sv}", [{"limit": ("i", -1)}], "'limit' must be a whole number"),
+                ("History", "a{sv}", [{"limit": ("t", 1 << 63)}], "'limit' must be a whole number"),
+                ("History", "a{sv}", [{"client": ("ay", b"x")}], "'client' must be a string"),
+                ("History", "a{sv}", [{"client": ("(s)", ("x",))}], "'client' holds a value of the type '(s)'"),
                 ("SetPreference", "ssa{sv}", ["com.example", "key", {"value": ("h", 0)}], ""),
                 ("SetPreference", "ssa{sv}", ["../escape", "key", {"value": ("s", "x")}], ""),
-                ("RequestAccess", "sa{sv}a{sv}", [FACEBOOK, facebook_options(), {"handle_token": ("v", ("s", "x"))}],
-                 "'handle_token' has the type 'v'")):
+                ("RequestAccess", "sa{sv}a{sv}", [FACEBOOK, facebook_options(), {"handle_token": ("i", 1)}],
+                 "'handle_token' must be a string"),
+                ("RequestAccess", "sa{sv}a{sv}", [FACEBOOK, {"FacebookAppIdKey": ("a{us}", {1: "x"})}, {}],
+                 "'FacebookAppIdKey' holds a value of the type 'a{us}'")):
             with self.subTest(method=method, values=values):
                 descriptors = [0] if ("h", 0) in values[-1].values() else ()
                 error = self.refusal_of(method, signature, values, descriptors=descriptors)

@@ -126,7 +126,7 @@ class TheDaemon(unittest.TestCase):
             manager + "RequestAccess com.veltran.accounttype.facebook '{}' \"{'handle_token': <'a/b'>}\"":
                 "InvalidArguments: 'handle_token' may hold",
             manager + "RequestAccess com.veltran.accounttype.facebook '{}' \"{'handle_token': <1>}\"":
-                "InvalidArguments: The option 'handle_token' has the type 'i' instead of 's'",
+                "InvalidArguments: The option 'handle_token' must be a string.",
             manager + "ListAccounts '' \"{'colour': <'red'>}\"": "InvalidArguments: There is no option 'colour'",
             manager + "Revoke com.veltran.accounttype.facebook org.example.nobody '{}'": "NoSuchClient",
             manager + "RemoveAccount 7 '{}'": "NoSuchAccount",
