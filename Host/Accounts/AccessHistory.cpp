@@ -29,38 +29,52 @@ void AccessHistory::append(const AccessRequestRecord& record, Date at) {
                         .userPrompted = record.userPrompted,
                         .elapsedSeconds = record.elapsedSeconds});
     ++_appended;
-    _isUrgent |= record.userPrompted || _waiting.size() >= largestBatch;
-    wakesWriter = _isUrgent || _waiting.size() == 1;
+    const bool wasDue = _isDue;
+    _isDue |= !record.userPrompted || _waiting.size() >= largestBatch;
+    wakesWriter = (_isDue && !wasDue) || _waiting.size() == largestBatch;
   }
   if (wakesWriter) _hasWork.notify_one();
 }
 
-std::vector<HistoryEntry> AccessHistory::entries(const HistoryFilter& filter) {
-  {
-    std::unique_lock lock(_mutex);
-    const std::uint64_t last = _appended;
-    _isUrgent |= !_waiting.empty();
-    _hasWork.notify_one();
-    _hasWritten.wait(lock, [&] { return _written >= last; });
+void AccessHistory::flush() {
+  std::unique_lock lock(_mutex);
+  const std::uint64_t last = _appended;
+  while (_written < last) {
+    if (_isWriting) {
+      _hasWritten.wait(lock);
+    } else {
+      writeBatch(lock);
+    }
   }
+}
+
+std::vector<HistoryEntry> AccessHistory::entries(const HistoryFilter& filter) {
+  flush();
   return _store.history(filter);
 }
 
 void AccessHistory::write() {
   std::unique_lock lock(_mutex);
   while (true) {
-    _hasWork.wait(lock, [&] { return _isEnding || !_waiting.empty(); });
-    if (_waiting.empty()) return;
-    _hasWork.wait_for(lock, longestDelay, [&] { return _isEnding || _isUrgent; });
-    const std::vector<HistoryEntry> batch = std::exchange(_waiting, {});
-    _isUrgent = false;
-    lock.unlock();
-    const auto error = _store.appendToHistory(batch);
-    if (error) _onFailure(*error);
-    lock.lock();
-    _written += batch.size();
-    _hasWritten.notify_all();
+    _hasWork.wait(lock, [&] { return _isEnding || _isDue; });
+    _hasWork.wait_for(lock, longestDelay, [&] { return _isEnding || _waiting.size() >= largestBatch; });
+    _isDue = false;
+    _hasWritten.wait(lock, [&] { return !_isWriting; });
+    if (!_waiting.empty()) writeBatch(lock);
+    if (_isEnding && _waiting.empty()) return;
   }
+}
+
+void AccessHistory::writeBatch(std::unique_lock<std::mutex>& lock) {
+  const std::vector<HistoryEntry> batch = std::exchange(_waiting, {});
+  _isWriting = true;
+  lock.unlock();
+  const auto error = _store.appendToHistory(batch);
+  if (error) _onFailure(*error);
+  lock.lock();
+  _isWriting = false;
+  _written += batch.size();
+  _hasWritten.notify_all();
 }
 
 }  // namespace palisade

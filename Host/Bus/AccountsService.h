@@ -65,12 +65,16 @@ struct AccessOutcome {
   std::optional<Error> error = std::nullopt;
 };
 
-/// A request for access under way. `becomePending` answers the call with the path of a Request object, so that the caller need
-/// not wait for its reply; the outcome then comes as the object's signal. Only the first call does something.
+/// A request for access under way.
 class PendingRequest {
  public:
   virtual ~PendingRequest() = default;
+  /// The operation is about to wait: lets another thread read the bus, which first answers the call with the path of a Request
+  /// object. The outcome then comes as the object's signal. Called once, on the thread that carries the request.
   virtual void becomePending() = 0;
+  /// Tells a caller that holds a Request object the outcome, from whatever thread brings it; what the operation answers later
+  /// is passed over. Does nothing for a call that waits for its reply.
+  virtual void answerAtOnce(const AccessOutcome& outcome) = 0;
   /// Tells requests apart in `AccountsService::close`.
   virtual std::uint64_t identifier() const = 0;
 };

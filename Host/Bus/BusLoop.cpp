@@ -32,6 +32,7 @@ void BusLoop::run() {
   {
     const std::lock_guard lock(_mutex);
     followers.swap(_followers);
+    _firstOfNextLeader.clear();
   }
   for (std::thread& follower : followers) follower.join();
   if (_failure != nullptr) std::rethrow_exception(_failure);
@@ -49,20 +50,24 @@ void BusLoop::wake() { eventfd_write(_wakeUp, 1); }
 
 void BusLoop::defer(std::function<void()> work) { deferredWork.push_back(std::move(work)); }
 
-void BusLoop::handOver() {
-  if (ledLoop != nullptr) ledLoop->giveUpLead();
+void BusLoop::handOver(std::function<void()> first) {
+  if (ledLoop == nullptr) return first();
+  ledLoop->giveUpLead(std::move(first));
 }
 
-void BusLoop::giveUpLead() {
+void BusLoop::giveUpLead(std::function<void()> first) {
   ledLoop = nullptr;
-  const std::lock_guard lock(_mutex);
-  _hasLeader = false;
-  if (_isStopping) return;
-  if (_parked > 0) {
-    _leadIsFree.notify_one();
-  } else {
-    _followers.emplace_back([this] { serve(); });
+  {
+    const std::lock_guard lock(_mutex);
+    _hasLeader = false;
+    if (_isStopping) return;
+    _firstOfNextLeader.push_back(std::move(first));
+    if (_parked == 0) {
+      _followers.emplace_back([this] { serve(); });
+      return;
+    }
   }
+  _leadIsFree.notify_one();
 }
 
 void BusLoop::serve() {
@@ -85,6 +90,13 @@ void BusLoop::serve() {
 void BusLoop::lead() {
   ledLoop = this;
   try {
+    std::vector<std::function<void()>> first;
+    {
+      const std::lock_guard lock(_mutex);
+      first.swap(_firstOfNextLeader);
+    }
+    for (const auto& work : first) work();
+    first.clear();
     while (ledLoop == this) readOnce();
   } catch (...) {
     {

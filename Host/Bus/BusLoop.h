@@ -37,8 +37,9 @@ class BusLoop {
   /// Has `work` run by this thread when the message handler has returned.
   static void defer(std::function<void()> work);
 
-  /// Lets another thread read the bus. On any thread but the leader it does nothing.
-  static void handOver();
+  /// Lets another thread read the bus, after it has run `first`. Any thread but the leader runs `first` itself, and that is
+  /// all.
+  static void handOver(std::function<void()> first = [] {});
 
   /// Has the leader look at the connection again: there may be something to send.
   void wake();
@@ -48,7 +49,7 @@ class BusLoop {
   void lead();
   void readOnce();
   void waitForMessages();
-  void giveUpLead();
+  void giveUpLead(std::function<void()> first);
 
   sdbus::IConnection& _connection;
   int _wakeUp;
@@ -56,6 +57,7 @@ class BusLoop {
   std::mutex _mutex;
   std::condition_variable _leadIsFree;
   std::vector<std::thread> _followers;
+  std::vector<std::function<void()>> _firstOfNextLeader;
   std::size_t _parked = 0;
   bool _hasLeader = false;
   bool _isStopping = false;

@@ -8,8 +8,11 @@
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
+#include <functional>
 #include <map>
 #include <mutex>
+#include <utility>
+#include <vector>
 
 #include "DBus/Accounts1Adaptor.h"
 #include "Host/Bus/BusLoop.h"
@@ -141,6 +144,12 @@ class BusServer::Implementation final : private OwnedConnection,
 
   ~Implementation() { unregisterAdaptor(); }
 
+  /// Sent when the call that brought it has been answered: whoever asked waits for that, and nobody for a signal.
+  void sendAfterAnswer(std::function<void()> send) {
+    const std::lock_guard lock(_mutex);
+    _waitingSignals.push_back(std::move(send));
+  }
+
   BusLoop& loop() { return _loop; }
   BusNotifications& notifications() { return _notifications; }
 
@@ -162,8 +171,8 @@ class BusServer::Implementation final : private OwnedConnection,
   void RequestAccess(AccessResult&& result, std::string accountType, Dictionary accessOptions, Dictionary options) override {
     startRequest(std::move(result), options,
                  [this, accountType = std::move(accountType),
-                  accessOptions = std::make_shared<const Dictionary>(std::move(accessOptions))](
-                     const BusCaller& caller, PendingRequest& request) {
+                  accessOptions = std::make_shared<const Dictionary>(std::move(accessOptions))](const BusCaller& caller,
+                                                                                                PendingRequest& request) {
                    return _service.requestAccess(caller, accountType, accessOptions, request);
                  });
   }
@@ -217,8 +226,7 @@ class BusServer::Implementation final : private OwnedConnection,
 
   void History(sdbus::Result<BusRows>&& result, Dictionary options) override {
     start(std::move(result), options, {"limit", "client"}, [this, options](const BusCaller& caller) {
-      return rowsToBus(_service.history(caller, numberOption(options, "limit").value_or(100),
-                                        textOption(options, "client")));
+      return rowsToBus(_service.history(caller, numberOption(options, "limit").value_or(100), textOption(options, "client")));
     });
   }
 
@@ -231,8 +239,7 @@ class BusServer::Implementation final : private OwnedConnection,
     start(std::move(result), options, {}, [this](const BusCaller& caller) { return rowsToBus(_service.listClients(caller)); });
   }
 
-  void GetPreference(sdbus::Result<BusDictionary>&& result, std::string domain, std::string key,
-                     Dictionary options) override {
+  void GetPreference(sdbus::Result<BusDictionary>&& result, std::string domain, std::string key, Dictionary options) override {
     start(std::move(result), options, {}, [this, domain, key](const BusCaller& caller) {
       const auto value = _service.preference(caller, domain, key);
       return value ? dictionaryToBus({{"value", *value}}) : BusDictionary();
@@ -269,8 +276,10 @@ class BusServer::Implementation final : private OwnedConnection,
     checked([&] {
       refuseUnknownOptions(options, known);
       const auto reply = std::make_shared<Result>(std::forward<Result>(result));
-      BusLoop::defer(
-          [reply, caller = callerOfThisMessage(), work = std::move(work)] { answer(*reply, [&] { return work(*caller); }); });
+      BusLoop::defer([this, reply, caller = callerOfThisMessage(), work = std::move(work)] {
+        answer(*reply, [&] { return work(*caller); });
+        sendSignals();
+      });
     });
   }
 
@@ -279,11 +288,22 @@ class BusServer::Implementation final : private OwnedConnection,
     checked([&] {
       refuseUnknownOptions(options, {"handle_token"});
       const auto caller = callerOfThisMessage();
-      const auto request = std::make_shared<BusRequest>(_requests, caller->uniqueName,
-                                                        textOption(options, "handle_token"), std::move(result));
-      BusLoop::defer(
-          [request, caller, work = std::move(work)] { carryOut(*request, [&] { return work(*caller, *request); }); });
+      const auto request =
+          std::make_shared<BusRequest>(_requests, caller->uniqueName, textOption(options, "handle_token"), std::move(result));
+      BusLoop::defer([this, request, caller, work = std::move(work)] {
+        carryOut(*request, [&] { return work(*caller, *request); });
+        sendSignals();
+      });
     });
+  }
+
+  void sendSignals() {
+    std::vector<std::function<void()>> waiting;
+    {
+      const std::lock_guard lock(_mutex);
+      waiting.swap(_waitingSignals);
+    }
+    for (const auto& send : waiting) send();
   }
 
   template <typename Body>
@@ -359,6 +379,7 @@ class BusServer::Implementation final : private OwnedConnection,
   RequestObjects _requests;
   std::mutex _mutex;
   std::map<std::string, std::shared_ptr<const BusCaller>> _callers;
+  std::vector<std::function<void()>> _waitingSignals;
   std::mutex _questionMutex;
   std::unique_ptr<sdbus::IConnection> _questions;
 };
@@ -374,10 +395,12 @@ NotificationBus& BusServer::notifications() { return _implementation->notificati
 
 void BusServer::start(const std::string& name) { _implementation->start(name); }
 
-void BusServer::emitAccountsChanged(const std::string& accountType) { _implementation->emitAccountsChanged(accountType); }
+void BusServer::emitAccountsChanged(const std::string& accountType) {
+  _implementation->sendAfterAnswer([this, accountType] { _implementation->emitAccountsChanged(accountType); });
+}
 
 void BusServer::emitGrantsChanged(const std::string& accountType, const std::string& client) {
-  _implementation->emitGrantsChanged(accountType, client);
+  _implementation->sendAfterAnswer([this, accountType, client] { _implementation->emitGrantsChanged(accountType, client); });
 }
 
 }  // namespace palisade

@@ -3,8 +3,8 @@
 /// The daemon's face on the session bus: com.veltran.Accounts1.
 ///
 /// Threads: `run` reads the bus on the calling thread and on followers, and returns after `stop`. The signals may be emitted
-/// from any thread. Ownership: owns its connection; borrows the service. Errors: a bus that cannot be reached, or a name that
-/// another daemon owns, is an exception that says so.
+/// from any thread; they are sent when the call that brings them has been answered. Ownership: owns its connection; borrows the
+/// service. Errors: a bus that cannot be reached, or a name that another daemon owns, is an exception that says so.
 
 #include <memory>
 #include <string>

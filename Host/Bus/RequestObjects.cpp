@@ -1,7 +1,12 @@
 #include "Host/Bus/RequestObjects.h"
 
+#include <sys/random.h>
+
 #include <algorithm>
-#include <random>
+#include <cerrno>
+#include <system_error>
+
+#include "Host/Bus/BusLoop.h"
 
 namespace palisade {
 namespace {
@@ -23,9 +28,14 @@ bool isPathElement(const std::string& token) {
   return !token.empty() && token.size() <= longestHandleToken && std::ranges::all_of(token, mayStand);
 }
 
+// The kernel's numbers: the standard library's device finds out each time what the processor can do, and where that is a
+// virtual one it takes longer than the rest of the call.
 std::string randomToken() {
-  std::random_device random;
-  return "t" + std::to_string(std::uint64_t{random()} << 32 | random());
+  std::uint64_t number = 0;
+  if (getrandom(&number, sizeof number, 0) != sizeof number) {
+    throw std::system_error(errno, std::generic_category(), "No path for the request");
+  }
+  return "t" + std::to_string(number);
 }
 
 BusDictionary resultsOf(const AccessOutcome& outcome) {
@@ -94,6 +104,18 @@ BusRequest::BusRequest(RequestObjects& objects, std::string caller, const std::o
 BusRequest::~BusRequest() = default;
 
 void BusRequest::becomePending() {
+  {
+    const std::lock_guard lock(_mutex);
+    _isPending = true;
+  }
+  // The thread that carries the request goes on with it meanwhile.
+  BusLoop::handOver([request = shared_from_this()] {
+    const std::lock_guard lock(request->_mutex);
+    request->announce();
+  });
+}
+
+void BusRequest::announce() {
   if (_object != nullptr) return;
   // Most requests never wait; only one that does needs a path, and pays for one that nobody can guess.
   if (_path == nullptr) _path = _objects.reserve(_caller, randomToken());
@@ -114,12 +136,28 @@ void BusRequest::becomePending() {
   _result.returnResults(sdbus::ObjectPath(*_path), static_cast<std::uint32_t>(AccessResponse::pending), {});
 }
 
-void BusRequest::finish(const AccessOutcome& outcome) {
-  const auto response = static_cast<std::uint32_t>(outcome.response);
-  if (_object == nullptr) {
-    _result.returnResults(sdbus::ObjectPath("/"), response, resultsOf(outcome));
-    return;
+void BusRequest::answerAtOnce(const AccessOutcome& outcome) {
+  const std::lock_guard lock(_mutex);
+  if (!_isPending || _isAnswered) return;
+  try {
+    send(outcome);
+    _isAnswered = true;
+  } catch (const sdbus::Error&) {
+    // The bus is gone. `finish` meets that too, where it ends the loop.
   }
+}
+
+void BusRequest::finish(const AccessOutcome& outcome) {
+  const std::lock_guard lock(_mutex);
+  if (_isAnswered) return;
+  send(outcome);
+  _isAnswered = true;
+}
+
+void BusRequest::send(const AccessOutcome& outcome) {
+  const auto response = static_cast<std::uint32_t>(outcome.response);
+  if (!_isPending) return _result.returnResults(sdbus::ObjectPath("/"), response, resultsOf(outcome));
+  announce();
   auto signal = _object->createSignal(requestInterface, "Response");
   signal << response << resultsOf(outcome);
   signal.setDestination(_caller);
@@ -127,11 +165,15 @@ void BusRequest::finish(const AccessOutcome& outcome) {
 }
 
 void BusRequest::fail(const BusFailure& failure) {
-  if (_object == nullptr) {
-    _result.returnError(busError(failure));
-    return;
-  }
   const auto error = busError(failure);
+  {
+    const std::lock_guard lock(_mutex);
+    if (_isAnswered) return;
+    if (!_isPending) {
+      _isAnswered = true;
+      return _result.returnError(error);
+    }
+  }
   finish({.response = failure.kind() == BusFailureKind::notAsked ? AccessResponse::withdrawn : AccessResponse::refused,
           .error = Error{.domain = error.getName(), .code = 0, .description = failure.what()}});
 }

@@ -2,8 +2,8 @@
 
 #include <algorithm>
 #include <future>
+#include <thread>
 
-#include "Host/Bus/BusLoop.h"
 #include "Host/Daemon/AtEnd.h"
 #include "Host/Daemon/OperationStore.h"
 #include "Host/Daemon/StoreCall.h"
@@ -49,10 +49,7 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
                                           PendingRequest& request, const PluginCall& call) {
   const auto plugin = pluginFor(accountType);
   const auto operation = std::make_shared<Operation>(
-      [&request] {
-        request.becomePending();
-        BusLoop::handOver();
-      },
+      [&request] { request.becomePending(); },
       Intent{.kind = Intent::Kind::grant, .accountTypeIdentifier = accountType, .clientID = client->id(), .appID = appID});
   {
     const std::lock_guard lock(_mutex);
@@ -77,12 +74,27 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
     const auto outcome = std::make_shared<std::promise<AccessOutcome>>();
     auto answer = outcome->get_future();
     call(*plugin, std::make_shared<const AccountType>(accountType), std::make_shared<OperationStore>(_parts.store, operation),
-         [outcome](bool granted, const std::optional<Error>& error) {
-           outcome->set_value({.response = granted ? AccessResponse::granted : AccessResponse::refused, .error = error});
+         [outcome, operation, &request](bool granted, const std::optional<Error>& error) {
+           const AccessOutcome result{.response = granted ? AccessResponse::granted : AccessResponse::refused, .error = error};
+           // After a grant nothing is left to do: who waits for it need not wait for another thread to wake up.
+           if (granted && !operation->failure()) request.answerAtOnce(result);
+           outcome->set_value(result);
          });
-    if (answer.wait_for(std::chrono::seconds(0)) != std::future_status::ready) operation->aboutToWait();
+    if (answer.wait_for(std::chrono::seconds(0)) != std::future_status::ready) {
+      operation->aboutToWait();
+      // What the call has woken goes first.
+      std::this_thread::yield();
+      // The user has agreed and the server is at work: a token that it issues from here on is taken back if this daemon dies.
+      if (operation->isAnsweredByUser())
+        operation->noteGrant([&](const Intent& grant) { return _parts.store.noteIntent(grant); });
+      if (operation->wasUserAsked()) _parts.history.flush();
+    }
     AccessOutcome result = answer.get();
 
+    if (operation->wasUserAsked()) _parts.history.flush();
+    if (operation->hasNotedGrant() && result.response != AccessResponse::granted) {
+      _parts.store.forgetIntent(AccountType(accountType), client->id());
+    }
     if (!operation->isAnsweredByUser() && result.response != AccessResponse::granted) {
       _parts.store.removeAnswersByNobodyForClient(*client);
       if (operation->isLeftUnanswered()) result.response = AccessResponse::withdrawn;

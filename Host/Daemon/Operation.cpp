@@ -18,6 +18,18 @@ void Operation::aboutToWait() {
   if (const auto first = std::exchange(_beforeFirstWait, nullptr)) first();
 }
 
+std::optional<Error> Operation::noteGrant(const std::function<std::optional<Error>(const Intent&)>& note) {
+  if (!_grant) return std::nullopt;
+  const std::lock_guard lock(_notingMutex);
+  if (!std::exchange(_hasNotedGrant, true)) _noteError = note(*_grant);
+  return _noteError;
+}
+
+bool Operation::hasNotedGrant() const {
+  const std::lock_guard lock(_notingMutex);
+  return _hasNotedGrant;
+}
+
 void Operation::fail(const BusFailure& failure) {
   const std::lock_guard lock(_mutex);
   if (!_failure) _failure = failure;

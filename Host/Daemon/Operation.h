@@ -31,6 +31,11 @@ class Operation {
 
   const std::optional<Intent>& grant() const { return _grant; }
 
+  /// Notes with `note` what the operation may come to, before anything of it is done. The first call notes; another one, from
+  /// whatever thread, waits for that and learns what it answered. Without a grant nothing is noted.
+  std::optional<Error> noteGrant(const std::function<std::optional<Error>(const Intent&)>& note);
+  bool hasNotedGrant() const;
+
   /// The operation may wait for long from here on.
   void aboutToWait();
 
@@ -70,6 +75,9 @@ class Operation {
   mutable std::mutex _mutex;
   std::set<std::shared_ptr<const std::function<void()>>> _interrupts;
   std::optional<BusFailure> _failure;
+  mutable std::mutex _notingMutex;
+  bool _hasNotedGrant = false;
+  std::optional<Error> _noteError;
 };
 
 /// Makes an operation the calling thread's current one.

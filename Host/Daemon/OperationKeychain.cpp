@@ -30,8 +30,8 @@ std::optional<Error> OperationKeychain::setCredentialForAccount(const std::share
                                                                 const std::optional<std::string>& clientID) {
   // The server's answers come on threads that carry no operation.
   const auto operation = clientID ? _operationOf(*clientID) : nullptr;
-  if (operation != nullptr && operation->grant()) {
-    auto unnoted = _store.noteIntent(*operation->grant());
+  if (operation != nullptr) {
+    auto unnoted = operation->noteGrant([this](const Intent& grant) { return _store.noteIntent(grant); });
     if (unnoted) return answered(std::move(unnoted), BusFailureKind::storeUnavailable, operation.get());
   }
   return answered(_keychain.setCredentialForAccount(account, clientID), BusFailureKind::keychainUnavailable, operation.get());

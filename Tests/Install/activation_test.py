@@ -105,6 +105,12 @@ class Session:
                              " VALUES ('1', '42', 1700000000, '', 0)")
         database.close()
 
+    def revocations_wait(self) -> bool:
+        database = sqlite3.connect(self.root / "home/.local/state/palisade/outbox.sqlite")
+        waiting = database.execute("SELECT count(*) FROM invalidations WHERE state = 'pending'").fetchone()[0]
+        database.close()
+        return waiting > 0
+
     def process_of(self, name: str) -> "int | None":
         """Who owns a name on the bus; asking starts nobody."""
         found = re.search(r"uint32 (\d+)", self.call_bus("GetConnectionUnixProcessID", name))
@@ -179,6 +185,7 @@ class TheInstalledDaemons(unittest.TestCase):
             session.run("palisade", "grants")
             wait_until(lambda: session.program_of("com.veltran.Vantad1") == f"{self.prefix}/libexec/vantad", "vantad is started")
 
+            wait_until(lambda: not session.revocations_wait(), "vantad has done what was left to it")
             os.kill(session.process_of("com.veltran.Vantad1"), 9)
             wait_until(lambda: session.process_of("com.veltran.Vantad1") is None, "vantad is gone")
             session.leave_revocation()

@@ -40,6 +40,19 @@ class AServerThatFails(unittest.TestCase):
             session.sandbox("calm")
             self.assertEqual(caller.start_request().outcome()[0], GRANTED)
 
+    def test_when_the_daemon_dies_has_the_token_taken_back_that_it_had_issued_already(self):
+        with trial.trial_with_account(log="error") as session, session.caller() as caller:
+            session.sandbox("fault", "silent", "--path", "/oauth/authorization")
+            asked = caller.start_request()
+            self.assertEqual(asked.reply()[0], PENDING)
+            wait_until(lambda: '"valid":true' in session.sandbox("tokens"), "the server has issued a token")
+            session.kill_accountd()
+            session.start_vantad()
+            session.start_accountd()
+            self.assertEqual(caller.grants(), {})
+            wait_until(lambda: [entry["state"] for entry in caller.revocations()] == ["confirmed"], "the server confirms")
+            self.assertNotIn('"valid":true', session.sandbox("tokens"))
+
     def test_while_access_is_taken_back_is_asked_again_when_both_daemons_have_been_killed(self):
         with trial.trial_with_account(log="error") as session, session.caller() as caller:
             self.assertEqual(caller.start_request().outcome()[0], GRANTED)

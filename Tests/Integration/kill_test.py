@@ -199,7 +199,8 @@ class Sweep:
                 is_acknowledged = self._operation.carry_out(caller)
                 caller.grants()
             except BusError as error:
-                if error.name != "NoReply":
+                # The answer comes first, and the signals follow: the daemon may be gone by the next call.
+                if error.name not in ("NoReply", "ServiceUnknown"):
                     raise
         return is_acknowledged
 

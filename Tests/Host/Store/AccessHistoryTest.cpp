@@ -49,6 +49,15 @@ TEST_F(TheAccessHistory, KeepsEveryFieldOfARequest) {
   EXPECT_EQ(entries[0].elapsedSeconds, 1.25);
 }
 
+TEST_F(TheAccessHistory, HasStoredWhatTheUserWasAskedAboutWhenItIsFlushed) {
+  AccessRequestRecord asked = requestOf("asked");
+  asked.userPrompted = true;
+  history->append(requestOf("before"), Date());
+  history->append(asked, Date());
+  history->flush();
+  EXPECT_THAT(clientsOf(store->history({})), ElementsAre("asked", "before"));
+}
+
 TEST_F(TheAccessHistory, StoresWhatIsLeftWhenItEnds) {
   for (int request = 0; request < 100; ++request) history->append(requestOf("client"), Date());
   history.reset();
