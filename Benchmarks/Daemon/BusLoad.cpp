@@ -28,24 +28,23 @@ double processorMicroseconds(pid_t process) {
   return static_cast<double>(used.tv_sec) * 1e6 + static_cast<double>(used.tv_nsec) / 1e3;
 }
 
-struct Timings {
-  std::vector<double> microseconds;
-  std::exception_ptr failure;
-};
+struct Client {
+  Bus bus = openBus();
+  std::vector<double> microseconds = {};
+  std::exception_ptr failure = nullptr;
 
-void callUntil(const std::atomic<bool>& isOver, const BusCall& call, Timings& timings) {
-  try {
-    const Bus bus = openBus();
-    call(*bus);  // The first call of a connection makes its server find out who is calling.
-    while (!isOver) {
-      const auto start = Clock::now();
-      call(*bus);
-      timings.microseconds.push_back(std::chrono::duration<double, std::micro>(Clock::now() - start).count());
+  void callUntil(const std::atomic<bool>& isOver, const BusCall& call) {
+    try {
+      while (!isOver) {
+        const auto start = Clock::now();
+        call(*bus);
+        microseconds.push_back(std::chrono::duration<double, std::micro>(Clock::now() - start).count());
+      }
+    } catch (...) {
+      failure = std::current_exception();
     }
-  } catch (...) {
-    timings.failure = std::current_exception();
   }
-}
+};
 
 }  // namespace
 
@@ -63,27 +62,29 @@ Bus openBus() {
 }
 
 Load measureLoad(const BusCall& call, int clients, std::chrono::milliseconds duration, pid_t server) {
+  std::vector<Client> all(static_cast<std::size_t>(clients));
+  // The first call of a connection makes its server find out who is calling.
+  for (const Client& client : all) call(*client.bus);
   std::atomic<bool> isOver = false;
-  std::vector<Timings> timings(static_cast<std::size_t>(clients));
   const double processorTimeBefore = processorMicroseconds(server);
   {
     std::vector<std::jthread> threads;
-    for (Timings& own : timings) threads.emplace_back([&] { callUntil(isOver, call, own); });
+    for (Client& client : all) threads.emplace_back([&] { client.callUntil(isOver, call); });
     std::this_thread::sleep_for(duration);
     isOver = true;
   }
   const double processorTime = processorMicroseconds(server) - processorTimeBefore;
 
-  std::vector<double> all;
-  for (const Timings& own : timings) {
-    if (own.failure) std::rethrow_exception(own.failure);
-    all.insert(all.end(), own.microseconds.begin(), own.microseconds.end());
+  std::vector<double> timings;
+  for (const Client& client : all) {
+    if (client.failure) std::rethrow_exception(client.failure);
+    timings.insert(timings.end(), client.microseconds.begin(), client.microseconds.end());
   }
-  if (all.empty()) throw BusCallError("No call was answered while the clients ran.");
-  std::ranges::sort(all);
-  const auto calls = static_cast<double>(all.size());
-  return {.medianMicroseconds = all[all.size() / 2],
-          .slowestHundredthMicroseconds = all[all.size() * 99 / 100],
+  if (timings.empty()) throw BusCallError("No call was answered while the clients ran.");
+  std::ranges::sort(timings);
+  const auto calls = static_cast<double>(timings.size());
+  return {.medianMicroseconds = timings[timings.size() / 2],
+          .slowestHundredthMicroseconds = timings[timings.size() * 99 / 100],
           .callsPerSecond = calls / std::chrono::duration<double>(duration).count(),
           .serverMicroseconds = processorTime / calls};
 }
