@@ -53,6 +53,7 @@ std::optional<std::chrono::milliseconds> Courier::advance() {
 }
 
 void Courier::hurry() {
+  _isHurried = _underWay.has_value();
   _tried.clear();
   _due.clear();
   _pause.reset();
@@ -121,6 +122,8 @@ void Courier::settleUnderWay(const HttpResult& result) {
   _transfer.reset();
   const Invalidation invalidation = *std::exchange(_underWay, std::nullopt);
   settle(invalidation, judge(result, _parts.json));
+  // What has changed meanwhile may have been in the way of this attempt too.
+  if (_isHurried) hurry();
 }
 
 void Courier::settle(const Invalidation& invalidation, const Verdict& verdict) {

@@ -86,6 +86,7 @@ class Courier {
   std::deque<Invalidation> _due;
   std::set<std::int64_t> _tried;  // since the last `hurry`; what has not been tried is due
   std::optional<Pause> _pause;
+  bool _isHurried = false;  // since what is under way was sent
 };
 
 }  // namespace palisade

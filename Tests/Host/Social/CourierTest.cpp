@@ -224,6 +224,15 @@ TEST_F(ACourier, TriesAgainAtOnceWhenTheNetworkHasChanged) {
   EXPECT_EQ(latest().attempts, 3);
 }
 
+TEST_F(ACourier, TriesAgainAtOnceWhenTheNetworkHasChangedDuringAnAttempt) {
+  sandbox.stop();
+  outbox->add("account", "app");
+  EXPECT_EQ(courier->advance(), std::nullopt) << "an attempt is under way";
+  courier->hurry();
+  EXPECT_EQ(work(), 10s) << "the pause after a second attempt";
+  EXPECT_EQ(latest().attempts, 2);
+}
+
 TEST_F(ACourier, TriesAgainAtOnceAfterARestart) {
   sandbox.stop();
   outbox->add("account", "app");
