@@ -127,11 +127,13 @@ class AccountsClient::Bus {
     if (first != AccessAnswer::Response::pending) return {first, results};
     whenPending();
     std::unique_lock lock(mutex);
-    while (!answer) {
-      // Without the daemon the signal will never come.
-      if (hasAnswer.wait_for(lock, std::chrono::seconds(1)) == std::cv_status::timeout && !hasOwner(busName)) {
+    while (!hasAnswer.wait_for(lock, std::chrono::seconds(1), [&] { return answer.has_value(); })) {
+      // Without the daemon the signal will never come. The bus is asked without the lock, for which the signal may be waiting.
+      lock.unlock();
+      if (!hasOwner(busName)) {
         throw CallFailed("NoReply", "The account daemon ended before the request was answered. Nothing was granted.");
       }
+      lock.lock();
     }
     return *answer;
   }
