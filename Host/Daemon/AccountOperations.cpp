@@ -63,21 +63,27 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
   });
 
   try {
-    const auto turn = _lanes.enter(client->id(), ClientLanes::Bound::kept, [&] { operation->aboutToWait(); });
+    auto turn = _lanes.enter(client->id(), ClientLanes::Bound::kept, [&] { operation->aboutToWait(); });
     if (operation->isWithdrawn()) return {.response = AccessResponse::withdrawn};
-    {
+    const auto noteTurn = [&](bool hasTurn) {
       const std::lock_guard lock(_mutex);
-      _running.at(operation.get()).hasTurn = true;
-    }
+      _running.at(operation.get()).hasTurn = hasTurn;
+    };
+    noteTurn(true);
 
     const OperationScope scope(*operation);
     const auto outcome = std::make_shared<std::promise<AccessOutcome>>();
     auto answer = outcome->get_future();
     call(*plugin, std::make_shared<const AccountType>(accountType), std::make_shared<OperationStore>(_parts.store, operation),
-         [outcome, operation, &request](bool granted, const std::optional<Error>& error) {
+         [&, outcome](bool granted, const std::optional<Error>& error) {
            const AccessOutcome result{.response = granted ? AccessResponse::granted : AccessResponse::refused, .error = error};
-           // After a grant nothing is left to do: who waits for it need not wait for another thread to wake up.
-           if (granted && !operation->failure()) request.answerAtOnce(result);
+           // After a grant nothing is left to do: its application need not wait for another thread to wake up, neither for the
+           // answer nor for its next turn.
+           if (granted && !operation->failure()) {
+             noteTurn(false);
+             turn.end();
+             request.answerAtOnce(result);
+           }
            outcome->set_value(result);
          });
     if (answer.wait_for(std::chrono::seconds(0)) != std::future_status::ready) {

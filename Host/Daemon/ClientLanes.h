@@ -16,6 +16,7 @@
 #include <optional>
 #include <stdexcept>
 #include <string>
+#include <utility>
 
 namespace palisade {
 
@@ -34,11 +35,17 @@ class ClientLanes {
     Turn(ClientLanes& lanes, std::optional<std::string> client) : _lanes(lanes), _client(std::move(client)) {}
     Turn(const Turn&) = delete;
     Turn& operator=(const Turn&) = delete;
-    ~Turn() { _lanes.leave(_client); }
+    ~Turn() { end(); }
+
+    /// Ends it before the object does. From any thread, but not from two at once.
+    void end() {
+      if (!std::exchange(_isOver, true)) _lanes.leave(_client);
+    }
 
    private:
     ClientLanes& _lanes;
     std::optional<std::string> _client;
+    bool _isOver = false;
   };
 
   enum class Bound {

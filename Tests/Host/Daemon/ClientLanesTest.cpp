@@ -89,6 +89,14 @@ class Lanes : public testing::Test {
   ClientLanes lanes{3};
 };
 
+TEST_F(Lanes, AreFreeAsSoonAsATurnIsEnded) {
+  const HeldTurn ended = hold("photos");
+  ended->end();
+  EXPECT_NE(hold("photos"), nullptr) << "and it does not end twice";
+  ended->end();
+  EXPECT_NE(hold("photos"), nullptr);
+}
+
 TEST_F(Lanes, GiveATurnAtOnceWhereNobodyIsInTheWay) {
   hold("editor");
   hold("editor");

@@ -137,5 +137,21 @@ TEST(TheCurrentOperation, IsItsThreadsAloneAsLongAsItIsCarried) {
   EXPECT_EQ(Operation::current(), nullptr);
 }
 
+TEST(AnOperation, NotesWhatItMayComeToOnce) {
+  Operation operation([] {}, Intent{.accountTypeIdentifier = "type", .clientID = "photos", .appID = "1"});
+  EXPECT_FALSE(operation.hasNotedGrant());
+  int notes = 0;
+  const auto note = [&](const Intent& grant) {
+    EXPECT_EQ(grant.clientID, "photos");
+    ++notes;
+    return std::optional(Error{.domain = "disk", .code = 1, .description = "It is full."});
+  };
+  for (int call = 0; call < 2; ++call) {
+    EXPECT_EQ(operation.noteGrant(note)->domain, "disk") << "whoever asks later learns what was answered";
+  }
+  EXPECT_EQ(notes, 1);
+  EXPECT_TRUE(operation.hasNotedGrant());
+}
+
 }  // namespace
 }  // namespace palisade
