@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <future>
-#include <thread>
 
 #include "Host/Daemon/AtEnd.h"
 #include "Host/Daemon/OperationStore.h"
@@ -88,8 +87,6 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
          });
     if (answer.wait_for(std::chrono::seconds(0)) != std::future_status::ready) {
       operation->aboutToWait();
-      // What the call has woken goes first.
-      std::this_thread::yield();
       // The user has agreed and the server is at work: a token that it issues from here on is taken back if this daemon dies.
       if (operation->isAnsweredByUser())
         operation->noteGrant([&](const Intent& grant) { return _parts.store.noteIntent(grant); });
