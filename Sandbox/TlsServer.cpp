@@ -6,7 +6,6 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <array>
 #include <memory>
 #include <string>
@@ -108,6 +107,7 @@ class TlsStream final : public httplib::Stream {
 bool TlsServer::process_and_close_socket(socket_t socket) {
   const timeval patience = {.tv_sec = read_timeout_sec_, .tv_usec = read_timeout_usec_};
   setsockopt(socket, SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+  setsockopt(socket, SOL_SOCKET, SO_SNDTIMEO, &patience, sizeof patience);
   const Connection connection(SSL_new(ssl_context()));
   SSL_set_fd(connection.get(), socket);
   SSL_set_read_ahead(connection.get(), 1);

@@ -5,7 +5,7 @@
 /// client.
 ///
 /// Threads: a connection is served on one thread of the library's pool. Errors: a connection on which TLS fails, or whose
-/// client stays silent in the middle of a request, is closed.
+/// client neither speaks nor listens in the middle of a request, is closed.
 
 #include <httplib.h>
 

@@ -58,6 +58,7 @@ class BusRequest final : public PendingRequest, public std::enable_shared_from_t
   void fail(const BusFailure& failure);
 
  private:
+  // Both are called under the lock.
   void announce();
   void send(const AccessOutcome& outcome);
 
