@@ -98,8 +98,8 @@ std::optional<std::string> PinnedProcess::userUnit() const {
   char* text = nullptr;
   const int result = sd_pid_get_user_unit(_process, &text);
   const std::unique_ptr<char, decltype(&std::free)> unit(text, &std::free);
-  // No unit, or no service manager at all.
-  if (result == -ENODATA || result == -ENOMEDIUM) return std::nullopt;
+  // No unit, or no service manager at all; the last is the answer where this process sees no /sys/fs/cgroup.
+  if (result == -ENODATA || result == -ENOMEDIUM || result == -ENOENT) return std::nullopt;
   errno = -result;
   if (result < 0) fail("has a unit that cannot be found out");
   return unit.get();

@@ -39,7 +39,8 @@ class PinnedProcess {
 
   std::string cgroups() const;
 
-  /// The unit of the user's service manager; none when the process runs outside all of them.
+  /// The unit of the user's service manager; none when the process runs outside all of them, and where no cgroup file system is
+  /// mounted.
   std::optional<std::string> userUnit() const;
 
   Program program() const;

@@ -1,6 +1,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <unistd.h>
 
+#include <filesystem>
+#include <string>
 #include <thread>
 #include <vector>
 
@@ -154,6 +157,18 @@ TEST(ARegistry, ServesManyThreadsAtOnce) {
     });
   }
   for (std::thread& thread : threads) thread.join();
+}
+
+// A container, a chroot or another init: the process identifies itself where there are no cgroups to be found.
+TEST(AProgramWhereNoCgroupsAreMounted, HasNoUnitAndIsKnownByItsPath) {
+  const std::string user = geteuid() == 0 ? "" : "--user --map-root-user ";
+  for (const std::string folder : {"/sys", "/sys/fs/cgroup"}) {
+    if (!std::filesystem::exists(folder)) continue;
+    EXPECT_EQ(outputOf("unshare " + user + "--mount sh -c 'mount -t tmpfs none " + folder +
+                       " && exec " TRIAL_PROGRAM " identify $$'"),
+              TRIAL_PROGRAM "\n")
+        << folder;
+  }
 }
 
 }  // namespace
