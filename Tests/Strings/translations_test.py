@@ -16,7 +16,6 @@ import po  # noqa: E402
 # Words that a language shares with English: language, text, reason.
 SHARED = {
     ("de", "Chats"): "the German word, capital included",
-    ("de", "Videos"): "the German word but for its capital",
 }
 
 # Letters of languages that do not use Latin ones.
