@@ -59,6 +59,16 @@ auto checked(const Call& call) {
   }
 }
 
+// The daemon hands a token over in a pipe that it has filled and closed, so reading does not wait.
+std::string contentOf(const sdbus::UnixFd& pipe) {
+  std::string content;
+  char buffer[4096];
+  ssize_t length = 0;
+  while ((length = read(pipe.get(), buffer, sizeof buffer)) > 0) content.append(buffer, static_cast<std::size_t>(length));
+  if (length < 0) throw CallFailed("Failed", "The token could not be read from the pipe that the account daemon handed over.");
+  return content;
+}
+
 std::string randomToken() {
   std::random_device random;
   return "palisade" + std::to_string(random()) + "_" + std::to_string(random());
@@ -177,7 +187,7 @@ AccessAnswer AccountsClient::authorize(const std::string& accountType, const std
 }
 
 std::string AccountsClient::credential(const std::string& accountType) {
-  return checked([&] { return _bus->manager().GetCredential(accountType, {}); });
+  return contentOf(checked([&] { return _bus->manager().GetCredentialDescriptor(accountType, {}); }));
 }
 
 Rows AccountsClient::listAccounts(const std::string& accountType) {

@@ -1,6 +1,7 @@
 #include "Benchmarks/Daemon/AccountsCalls.h"
 
 #include <systemd/sd-bus.h>
+#include <unistd.h>
 
 #include <cstdint>
 #include <optional>
@@ -103,9 +104,13 @@ int WaitingApplication::rememberOutcome(sd_bus_message* message, void* outcome, 
 void WaitingApplication::ReleaseSlot::operator()(sd_bus_slot* slot) const { sd_bus_slot_unref(slot); }
 
 void readCredential(sd_bus& bus) {
-  const Message call = newCall(bus, accounts, accountsPath, manager, "GetCredential");
+  const Message call = newCall(bus, accounts, accountsPath, manager, "GetCredentialDescriptor");
   requireSuccess(sd_bus_message_append(call.get(), "sa{sv}", facebook, 0), "The call cannot be written");
-  answerTo(bus, call);
+  const Message answer = answerTo(bus, call);
+  int pipe = -1;
+  requireSuccess(sd_bus_message_read(answer.get(), "h", &pipe), "GetCredentialDescriptor was answered otherwise");
+  char token[4096];
+  if (read(pipe, token, sizeof token) <= 0) throw BusCallError("The pipe holds no token.");
 }
 
 void revokeEverything(sd_bus& bus) {

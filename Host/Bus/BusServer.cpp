@@ -140,11 +140,6 @@ class BusServer::Implementation final : private OwnedConnection,
     });
   }
 
-  void GetCredential(sdbus::Result<std::string>&& result, std::string accountType, Dictionary options) override {
-    start(std::move(result), options, {},
-          [this, accountType](const BusCaller& caller) { return _service.credential(caller, accountType); });
-  }
-
   void GetCredentialDescriptor(sdbus::Result<sdbus::UnixFd>&& result, std::string accountType, Dictionary options) override {
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { return pipeHolding(_service.credential(caller, accountType)); });

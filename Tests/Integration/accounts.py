@@ -33,6 +33,13 @@ class Caller(Connection):
             signature, values = signature + "a{sv}", (*values, {})
         return self.call(NAME, OBJECT, MANAGER, method, signature, values, **more)
 
+    def manage_for_descriptor(self, method: str, signature: str, values) -> int:
+        """Calls a method that answers with a descriptor, which is the caller's to close."""
+        serial = self.start(method, signature + "a{sv}", (*values, {}))
+        message = self.reply_to(serial)
+        place, = message.answer()
+        return message.descriptors[place]
+
     def listen(self) -> None:
         """Has the bus deliver the daemon's signals, and tell of its end."""
         for rule in (f"type='signal',sender='{NAME}'", f"type='signal',member='NameOwnerChanged',arg0='{NAME}'"):
@@ -51,7 +58,8 @@ class Caller(Connection):
         return Request(self, self.start("Authorize", "ssa{sv}", [FACEBOOK, client, {"handle_token": ("s", token)}]), token)
 
     def credential(self) -> str:
-        return self.manage("GetCredential", "s", [FACEBOOK])[0]
+        with open(self.manage_for_descriptor("GetCredentialDescriptor", "s", [FACEBOOK]), encoding="utf-8") as pipe:
+            return pipe.read()
 
     def grants(self) -> dict[str, dict]:
         """Each client's record."""

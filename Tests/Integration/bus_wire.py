@@ -139,12 +139,12 @@ class Message:
         fields, at = read(data, 12, "a(yv)")
         self.fields = dict(fields)
         self.signature = self.fields.get(SIGNATURE, "")
-        self._body = data[at + -at % 8:]
+        self.body = data[at + -at % 8:]
         self.descriptors = descriptors
 
     @property
     def values(self) -> list:
-        return read_all(self._body, self.signature)
+        return read_all(self.body, self.signature)
 
     def answer(self) -> list:
         """The values of a reply; an error reply is raised."""

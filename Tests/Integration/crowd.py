@@ -11,12 +11,21 @@ from bus_wire import ERROR, REPLY_SERIAL, SLOWNESS, Message
 # What each connection asks, one after another without waiting; each begins at another question.
 QUESTIONS = [
     ("RequestAccess", "sa{sv}a{sv}", [FACEBOOK, facebook_options(), {}]),
-    ("GetCredential", "sa{sv}", [FACEBOOK, {}]),
+    ("GetCredentialDescriptor", "sa{sv}", [FACEBOOK, {}]),
     ("ListGrants", "sa{sv}", [FACEBOOK, {}]),
     ("RequestAccess", "sa{sv}a{sv}", ["nonsense", {}, {}]),
     ("Revoke", "ssa{sv}", [FACEBOOK, "org.example.nobody", {}]),
 ]
 LONGEST_WAIT = 60 * SLOWNESS
+
+
+def all_read_from(descriptors) -> list[str]:
+    """What each descriptor brings to its end."""
+    contents = []
+    for descriptor in descriptors:
+        with open(descriptor, encoding="utf-8") as pipe:
+            contents.append(pipe.read())
+    return contents
 
 
 def problem_with(question: int, answer: Message, token: str, clients: set[str]) -> str | None:
@@ -26,7 +35,7 @@ def problem_with(question: int, answer: Message, token: str, clients: set[str]) 
         name = answer.fields[4].rpartition(".")[2]
         return None if name == expected else f"question {question} is answered with the error {name}: {answer.values}"
     values = answer.values
-    is_right = [lambda: values == ["/", GRANTED, {}], lambda: values == [token],
+    is_right = [lambda: values == ["/", GRANTED, {}], lambda: all_read_from(answer.descriptors) == [token],
                 lambda: {row["client"] for row in values[0]} == clients, lambda: False, lambda: False][question]()
     return None if is_right else f"question {question} is answered {values}"
 
