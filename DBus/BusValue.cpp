@@ -7,6 +7,8 @@
 #include <utility>
 #include <vector>
 
+#include "Host/Text/ValidText.h"
+
 namespace palisade {
 namespace {
 
@@ -16,7 +18,7 @@ sdbus::Variant arrayToBus(const Array& array) {
   std::vector<std::string> strings;
   for (const Value& element : array) {
     if (element.string() == nullptr) break;
-    strings.push_back(*element.string());
+    strings.push_back(validText(*element.string()));
   }
   if (strings.size() == array.size()) return strings;
   std::vector<sdbus::Variant> variants;
@@ -29,7 +31,7 @@ sdbus::Variant variantFromValue(const Value& value) {
   if (const std::int64_t* integer = value.integer()) return *integer;
   if (const std::uint64_t* largeInteger = value.largeInteger()) return *largeInteger;
   if (const double* real = value.real()) return *real;
-  if (const std::string* text = value.string()) return *text;
+  if (const std::string* text = value.string()) return validText(*text);
   if (const Array* array = value.array()) return arrayToBus(*array);
   if (const Dictionary* dictionary = value.dictionary()) return dictionaryToBus(*dictionary);
   return std::string();
@@ -118,7 +120,7 @@ sdbus::Message& operator>>(sdbus::Message& message, Dictionary& dictionary) {
 BusDictionary dictionaryToBus(const Dictionary& dictionary) {
   BusDictionary entries;
   for (const auto& [key, value] : dictionary) {
-    if (!value.isNull()) entries.emplace(key, variantFromValue(value));
+    if (!value.isNull()) entries.emplace(validText(key), variantFromValue(value));
   }
   return entries;
 }

@@ -5,7 +5,7 @@
 ///
 /// Every basic D-Bus type has a place: the smaller integers become integers, object paths and signatures strings. Arrays and
 /// dictionaries with string keys are converted with all that they hold, nested as deep as D-Bus allows; a variant is what it
-/// holds.
+/// holds. Text that the bus's library does not send (ValidText.h) is repaired, so that one bad name spoils no listing.
 /// Threads: pure functions. Errors: `UnsuitableType` for a type that has no place, such as a file descriptor.
 
 #include <sdbus-c++/Error.h>

@@ -24,6 +24,7 @@ constexpr FaultKindName faultNames[] = {
     {FaultKind::types, "types", "answers an object whose members have the wrong types"},
     {FaultKind::duplicate, "duplicate", "answers an object in which names occur twice"},
     {FaultKind::text, "text", "answers a string that is not UTF-8"},
+    {FaultKind::message, "message", "refuses in a message that no terminal should see as it is"},
     {FaultKind::page, "page", "answers a page for browsers"},
     {FaultKind::garbage, "garbage", "answers something that is not HTTP"},
 };

@@ -37,6 +37,7 @@ enum class FaultKind {
   types,
   duplicate,
   text,
+  message,
   page,
   garbage
 };

@@ -83,6 +83,10 @@ void answerWithFault(const Fault& fault, const std::string& answer, RawConnectio
   static constexpr const char* types = R"({"access_token":7,"permissions":"email","error_msg":["no",{"token":null}]})";
   static constexpr const char* duplicates =
       R"({"access_token":"first","permissions":["email"],"access_token":"second","permissions":["publish_stream"]})";
+  // Escape sequences, a bell, a line of its own, marks that turn the text around, and code points that are no characters.
+  static constexpr const char* message =
+      "{\"error\":\"fault\",\"error_msg\":\"Red: \\u001b[31m\\u001b]0;title\\u0007\\u009b2J\\r\\nAccess is granted."
+      "\\u202Eturned\\u2066\\u200B \xEF\xB7\x90\xEF\xB7\xAF\xEF\xBF\xBE\xEF\xBF\xBF\xF4\x8F\xBF\xBF end\"}";
   static constexpr const char* page = "<!DOCTYPE html><title>Sign in</title><p>Please sign in to use this network.";
   switch (fault.kind) {
     case FaultKind::silent: connection.waitForClient(); break;
@@ -112,6 +116,7 @@ void answerWithFault(const Fault& fault, const std::string& answer, RawConnectio
     case FaultKind::types: connection.write(json(200, types)); break;
     case FaultKind::duplicate: connection.write(json(200, duplicates)); break;
     case FaultKind::text: connection.write(json(200, "\"\xC3\x28\"")); break;
+    case FaultKind::message: connection.write(json(400, message)); break;
     case FaultKind::page:
       connection.write(
           head(200, "Content-Type: text/html\r\nContent-Length: " + std::to_string(std::string(page).size()) + "\r\n") + page);

@@ -16,6 +16,7 @@
 
 #include "Host/Alert/PortalBackend.h"
 #include "Host/Files/FileDescriptor.h"
+#include "Host/Text/ValidText.h"
 
 namespace palisade {
 namespace {
@@ -122,13 +123,13 @@ class BusAccessDialog final : public AccessDialog {
  private:
   void ask(const AccessQuestion& question) {
     const Options options = {{"modal", true},
-                             {"deny_label", question.denyLabel},
-                             {"grant_label", question.grantLabel},
+                             {"deny_label", validText(question.denyLabel)},
+                             {"grant_label", validText(question.grantLabel)},
                              {"icon", std::string("dialog-password-symbolic")}};
     _portal = sdbus::createProxy(*_connection, _owner.value_or(_backend), portalPath);
     auto call = _portal->createMethodCall(std::string(accessInterface), "AccessDialog");
-    call << sdbus::ObjectPath(_handle) << unnamedApplication << noParentWindow << question.title << question.subtitle
-         << question.body << options;
+    call << sdbus::ObjectPath(_handle) << unnamedApplication << noParentWindow << validText(question.title)
+         << validText(question.subtitle) << validText(question.body) << options;
     _portal->callMethod(
         call, [this](sdbus::MethodReply& reply, const sdbus::Error* error) { replied(reply, error); }, withoutTimeout);
   }

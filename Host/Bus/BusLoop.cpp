@@ -1,6 +1,7 @@
 #include "Host/Bus/BusLoop.h"
 
 #include <poll.h>
+#include <sdbus-c++/Error.h>
 #include <sdbus-c++/IConnection.h>
 #include <sys/eventfd.h>
 #include <unistd.h>
@@ -14,13 +15,19 @@
 namespace palisade {
 namespace {
 
+// What the library calls a message that breaks its rules. It has passed over the message when it says so.
+constexpr const char* unreadableMessage = "org.freedesktop.DBus.Error.InconsistentMessage";
+
 // The loop that this thread leads, or null.
 thread_local BusLoop* ledLoop = nullptr;
 thread_local std::vector<std::function<void()>> deferredWork;
 
 }  // namespace
 
-BusLoop::BusLoop(sdbus::IConnection& connection) : _connection(connection), _wakeUp(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
+BusLoop::BusLoop(sdbus::IConnection& connection, std::function<void(const std::string&)> onTrouble)
+    : _connection(connection),
+      _onTrouble(std::move(onTrouble)),
+      _wakeUp(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
   if (_wakeUp < 0) throw std::system_error(errno, std::generic_category(), "No event descriptor for the bus loop");
 }
 
@@ -95,7 +102,7 @@ void BusLoop::lead() {
       const std::lock_guard lock(_mutex);
       first.swap(_firstOfNextLeader);
     }
-    for (const auto& work : first) work();
+    for (const auto& work : first) carryOut(work);
     first.clear();
     while (ledLoop == this) readOnce();
   } catch (...) {
@@ -109,15 +116,34 @@ void BusLoop::lead() {
 }
 
 void BusLoop::readOnce() {
-  const bool mayHoldMore = _connection.processPendingRequest();
+  const bool mayHoldMore = processNext();
   const bool hadWork = !deferredWork.empty();
-  for (const auto& work : std::exchange(deferredWork, {})) work();
+  for (const auto& work : std::exchange(deferredWork, {})) carryOut(work);
   if (ledLoop != this) {
     // What this thread answered may wait to be sent; only the leader watches for that.
     wake();
     return;
   }
   if (!mayHoldMore && !hadWork) waitForMessages();
+}
+
+bool BusLoop::processNext() {
+  try {
+    return _connection.processPendingRequest();
+  } catch (const sdbus::Error& error) {
+    if (error.getName() != unreadableMessage) throw;
+    _onTrouble("A message that cannot be read was passed over: " + error.getMessage());
+    return true;
+  }
+}
+
+// What one caller asks for must not cost the others the daemon. Where the connection itself is lost, reading says so.
+void BusLoop::carryOut(const std::function<void()>& work) {
+  try {
+    work();
+  } catch (const std::exception& failure) {
+    _onTrouble(std::string("What a call asked for was cut short: ") + failure.what());
+  }
 }
 
 void BusLoop::waitForMessages() {

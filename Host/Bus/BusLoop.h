@@ -5,13 +5,16 @@
 /// One thread, the leader, waits for messages. A message's work runs on the leader itself, so an answer that needs nobody
 /// changes no thread. Work that is about to wait (for a user, a server, a disk) calls `handOver`: another thread becomes the
 /// leader and goes on reading, and the first one comes back as a follower when its work is done. A work that waits for a day
-/// delays nobody. Threads: `run` is called once and returns after `stop`; `defer` is called from message handlers; `handOver`,
-/// `wake` and `stop` from anywhere. Ownership: borrows the connection. Errors: a lost connection ends `run` with an exception.
+/// delays nobody. Work that throws has failed alone, and so has a message that cannot be read: the loop goes on. Threads: `run`
+/// is called once and returns after `stop`; `defer` is called from message handlers; `handOver`, `wake` and `stop` from
+/// anywhere. Ownership: borrows the connection. Errors: a lost connection ends `run` with an exception; `onTrouble` is told
+/// everything else, on the thread that meets it.
 
 #include <condition_variable>
 #include <cstddef>
 #include <functional>
 #include <mutex>
+#include <string>
 #include <thread>
 #include <vector>
 
@@ -23,7 +26,7 @@ namespace palisade {
 
 class BusLoop {
  public:
-  explicit BusLoop(sdbus::IConnection& connection);
+  BusLoop(sdbus::IConnection& connection, std::function<void(const std::string&)> onTrouble);
   ~BusLoop();
 
   BusLoop(const BusLoop&) = delete;
@@ -48,10 +51,13 @@ class BusLoop {
   void serve();
   void lead();
   void readOnce();
+  bool processNext();
+  void carryOut(const std::function<void()>& work);
   void waitForMessages();
   void giveUpLead(std::function<void()> first);
 
   sdbus::IConnection& _connection;
+  const std::function<void(const std::string&)> _onTrouble;
   int _wakeUp;
 
   std::mutex _mutex;

@@ -14,6 +14,7 @@
 #include "Host/Bus/BusNotifications.h"
 #include "Host/Bus/RequestObjects.h"
 #include "Host/Bus/TokenPipe.h"
+#include "Host/Text/ValidText.h"
 
 namespace palisade {
 namespace {
@@ -57,9 +58,15 @@ std::optional<std::uint32_t> numberOption(const Dictionary& options, std::string
   return static_cast<std::uint32_t>(*option->integer());
 }
 
-// Carries out `work` and sends what it returns, or the failure that it throws.
+// The library has refused a reply: it is too large, say.
+BusFailure unsendable(const sdbus::Error& refusal) {
+  return {BusFailureKind::failed, "The answer cannot be sent over the bus: " + refusal.getMessage()};
+}
+
+// Carries out `work` and sends what it returns, or the failure that it throws. Says what was told the caller in place of a
+// reply that could not be sent.
 template <typename Result, typename Work>
-void answer(const Result& result, const Work& work) {
+std::optional<BusFailure> answer(const Result& result, const Work& work) {
   try {
     if constexpr (std::is_void_v<decltype(work())>) {
       work();
@@ -69,11 +76,14 @@ void answer(const Result& result, const Work& work) {
     }
   } catch (const BusFailure& failure) {
     result.returnError(busError(failure));
-  } catch (const sdbus::Error&) {
-    throw;
+  } catch (const sdbus::Error& failure) {
+    const BusFailure refusal = unsendable(failure);
+    result.returnError(busError(refusal));
+    return refusal;
   } catch (const std::exception& failure) {
     result.returnError(busError({BusFailureKind::failed, failure.what()}));
   }
+  return std::nullopt;
 }
 
 // A base of its own, so that the connection is made before the object that is served on it, and goes away after it.
@@ -86,10 +96,11 @@ struct OwnedConnection {
 class BusServer::Implementation final : private OwnedConnection,
                                         public sdbus::AdaptorInterfaces<com::veltran::Accounts1::Manager_adaptor> {
  public:
-  explicit Implementation(AccountsService& service)
+  Implementation(AccountsService& service, std::function<void(const std::string&)> onTrouble)
       : AdaptorInterfaces(*_connection, objectPath),
         _service(service),
-        _loop(*_connection),
+        _onTrouble(std::move(onTrouble)),
+        _loop(*_connection, _onTrouble),
         _notifications(*_connection),
         _requests(*_connection, [this](std::uint64_t identifier) { _service.close(identifier); }) {
     _connection->addMatch(
@@ -229,7 +240,7 @@ class BusServer::Implementation final : private OwnedConnection,
       refuseUnknownOptions(options, known);
       const auto reply = std::make_shared<Result>(std::forward<Result>(result));
       BusLoop::defer([this, reply, caller = callerOfThisMessage(), work = std::move(work)] {
-        answer(*reply, [&] { return work(*caller); });
+        if (const auto refusal = answer(*reply, [&] { return work(*caller); })) _onTrouble(refusal->what());
         sendSignals();
       });
     });
@@ -255,7 +266,13 @@ class BusServer::Implementation final : private OwnedConnection,
       const std::lock_guard lock(_mutex);
       waiting.swap(_waitingSignals);
     }
-    for (const auto& send : waiting) send();
+    for (const auto& send : waiting) {
+      try {
+        send();
+      } catch (const sdbus::Error& failure) {
+        _onTrouble("A signal could not be sent: " + failure.getMessage());
+      }
+    }
   }
 
   template <typename Body>
@@ -264,17 +281,21 @@ class BusServer::Implementation final : private OwnedConnection,
       body();
     } catch (const BusFailure& failure) {
       throw busError(failure);
+    } catch (const std::exception& failure) {
+      throw busError({BusFailureKind::failed, failure.what()});
     }
   }
 
   template <typename Work>
-  static void carryOut(BusRequest& request, const Work& work) {
+  void carryOut(BusRequest& request, const Work& work) {
     try {
       request.finish(work());
     } catch (const BusFailure& failure) {
       request.fail(failure);
-    } catch (const sdbus::Error&) {
-      throw;
+    } catch (const sdbus::Error& failure) {
+      const BusFailure refusal = unsendable(failure);
+      _onTrouble(refusal.what());
+      request.fail(refusal);
     } catch (const std::exception& failure) {
       request.fail({BusFailureKind::failed, failure.what()});
     }
@@ -326,6 +347,7 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
   AccountsService& _service;
+  const std::function<void(const std::string&)> _onTrouble;
   BusLoop _loop;
   BusNotifications _notifications;
   RequestObjects _requests;
@@ -336,7 +358,8 @@ class BusServer::Implementation final : private OwnedConnection,
   std::unique_ptr<sdbus::IConnection> _questions;
 };
 
-BusServer::BusServer(AccountsService& service) : _implementation(std::make_unique<Implementation>(service)) {}
+BusServer::BusServer(AccountsService& service, std::function<void(const std::string&)> onTrouble)
+    : _implementation(std::make_unique<Implementation>(service, std::move(onTrouble))) {}
 
 BusServer::~BusServer() = default;
 
@@ -348,11 +371,12 @@ NotificationBus& BusServer::notifications() { return _implementation->notificati
 void BusServer::start(const std::string& name) { _implementation->start(name); }
 
 void BusServer::emitAccountsChanged(const std::string& accountType) {
-  _implementation->sendAfterAnswer([this, accountType] { _implementation->emitAccountsChanged(accountType); });
+  _implementation->sendAfterAnswer([this, type = validText(accountType)] { _implementation->emitAccountsChanged(type); });
 }
 
 void BusServer::emitGrantsChanged(const std::string& accountType, const std::string& client) {
-  _implementation->sendAfterAnswer([this, accountType, client] { _implementation->emitGrantsChanged(accountType, client); });
+  _implementation->sendAfterAnswer(
+      [this, type = validText(accountType), name = validText(client)] { _implementation->emitGrantsChanged(type, name); });
 }
 
 }  // namespace palisade

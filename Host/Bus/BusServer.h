@@ -4,8 +4,10 @@
 ///
 /// Threads: `run` reads the bus on the calling thread and on followers, and returns after `stop`. The signals may be emitted
 /// from any thread; they are sent when the call that brings them has been answered. Ownership: owns its connection; borrows the
-/// service. Errors: a bus that cannot be reached, or a name that another daemon owns, is an exception that says so.
+/// service. Errors: a bus that cannot be reached, or a name that another daemon owns, is an exception that says so. A reply
+/// that cannot be sent becomes an error reply; what cannot even be said so, `onTrouble` is told.
 
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -16,7 +18,7 @@ namespace palisade {
 
 class BusServer {
  public:
-  explicit BusServer(AccountsService& service);
+  BusServer(AccountsService& service, std::function<void(const std::string& sentence)> onTrouble);
   ~BusServer();
 
   BusServer(const BusServer&) = delete;

@@ -7,6 +7,7 @@
 #include <system_error>
 
 #include "Host/Bus/BusLoop.h"
+#include "Host/Text/ValidText.h"
 
 namespace palisade {
 namespace {
@@ -41,9 +42,9 @@ std::string randomToken() {
 BusDictionary resultsOf(const AccessOutcome& outcome) {
   BusDictionary results;
   if (!outcome.error) return results;
-  results.emplace("error_domain", outcome.error->domain);
+  results.emplace("error_domain", validText(outcome.error->domain));
   results.emplace("error_code", std::int32_t{outcome.error->code});
-  if (outcome.error->description) results.emplace("error_message", *outcome.error->description);
+  if (outcome.error->description) results.emplace("error_message", validText(*outcome.error->description));
   return results;
 }
 
@@ -67,7 +68,7 @@ const char* nameOf(BusFailureKind kind) {
 }  // namespace
 
 sdbus::Error busError(const BusFailure& failure) {
-  return sdbus::Error(std::string("com.veltran.Accounts1.Error.") + nameOf(failure.kind()), failure.what());
+  return sdbus::Error(std::string("com.veltran.Accounts1.Error.") + nameOf(failure.kind()), validText(failure.what()));
 }
 
 RequestObjects::RequestObjects(sdbus::IConnection& connection, std::function<void(std::uint64_t)> close)
@@ -143,7 +144,7 @@ void BusRequest::answerAtOnce(const AccessOutcome& outcome) {
     send(outcome);
     _isAnswered = true;
   } catch (const sdbus::Error&) {
-    // The bus is gone. `finish` meets that too, where it ends the loop.
+    // `finish` meets that too, and tells.
   }
 }
 

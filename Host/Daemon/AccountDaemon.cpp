@@ -130,7 +130,7 @@ struct AccountDaemon::Parts {
                  .status = [this] { return status(); }}),
         pluginLog(log),
         pluginKeychain(*keychain, store, [this](const std::string& clientID) { return service.operationOf(clientID); }),
-        bus(service) {
+        bus(service, [this](const std::string& sentence) { tell(sentence); }) {
     lock.emplace(stateFolder(), "accountd", patienceWithAnother);
     // Only the one daemon of these stores may repair: another could be in the middle of a grant.
     for (const std::string& sentence : repairAfterCrash(store, *keychain, outbox)) tell(sentence);

@@ -5,6 +5,8 @@
 #include <cstddef>
 #include <optional>
 
+#include "Host/Text/ValidText.h"
+
 namespace palisade {
 namespace {
 
@@ -49,7 +51,7 @@ bool isUnseen(char32_t code) {
   struct Range {
     char32_t first, last;
   };
-  static constexpr std::array<Range, 12> ranges = {{{0x0, 0x1f},
+  static constexpr std::array<Range, 11> ranges = {{{0x0, 0x1f},
                                                     {0x7f, 0x9f},
                                                     {0xad, 0xad},
                                                     {0x61c, 0x61c},
@@ -59,10 +61,9 @@ bool isUnseen(char32_t code) {
                                                     {0x2060, 0x206f},
                                                     {0xfeff, 0xfeff},
                                                     {0xfff9, 0xfffb},
-                                                    {0xfffe, 0xffff},
                                                     {0xe0000, 0xe007f}}};
-  return std::any_of(ranges.begin(), ranges.end(),
-                     [code](const Range& range) { return code >= range.first && code <= range.last; });
+  return isNoncharacter(code) || std::any_of(ranges.begin(), ranges.end(),
+                                             [code](const Range& range) { return code >= range.first && code <= range.last; });
 }
 
 }  // namespace

@@ -192,12 +192,20 @@ class Connection:
     def send(self, destination: str, path: str, interface: str, member: str, signature: str = "", values=(), *,
              body: bytes | None = None, descriptors=()) -> int:
         """Sends a call, with `body` in place of the values' own bytes if it is given. Returns its serial number."""
-        self._serial += 1
         content = marshalled(signature, values) if body is None else body
         fields = {PATH: path, INTERFACE: interface, MEMBER: member, DESTINATION: destination, SIGNATURE: signature}
+        return self._send(CALL, fields, content, descriptors)
+
+    def emit(self, destination: str | None, path: str, interface: str, member: str, signature: str = "", values=()) -> None:
+        """Sends a signal: to everybody who listens, or to one destination."""
+        fields = {PATH: path, INTERFACE: interface, MEMBER: member, DESTINATION: destination, SIGNATURE: signature}
+        self._send(SIGNAL, fields, marshalled(signature, values))
+
+    def _send(self, kind: int, fields: dict, content: bytes, descriptors=()) -> int:
+        self._serial += 1
         if descriptors:
             fields[DESCRIPTORS] = len(descriptors)
-        header = bytearray(struct.pack("<BBBBII", ord("l"), CALL, 0, 1, len(content), self._serial))
+        header = bytearray(struct.pack("<BBBBII", ord("l"), kind, 0, 1, len(content), self._serial))
         write(header, "a(yv)", [(code, (FIELD_TYPES[code], value)) for code, value in fields.items() if value])
         pad(header, 8)
         message = bytes(header) + content
