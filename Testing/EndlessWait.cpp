@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cerrno>
+#include <cstring>
 #include <sstream>
 #include <stdexcept>
 
@@ -13,13 +14,29 @@
 namespace palisade {
 namespace {
 
-// The whole of a small file of proc(5); none when the thread has ended meanwhile.
+[[noreturn]] void fail(const std::string& path, int reason) {
+  throw std::runtime_error("Cannot tell whether a thread waits: " + path + " cannot be opened: " + std::strerror(reason) + ".");
+}
+
+// A thread that ends gives its memory back first. From then on until it is gone, its private files belong to root, so that
+// nobody else may open them. They belong to root all the time in a process that is closed to its own user; the asking thread,
+// which does not end, tells the one from the other.
+void requireThatTheProcessIsOpen() {
+  const char* const path = "/proc/thread-self/syscall";
+  const int descriptor = open(path, O_RDONLY | O_CLOEXEC);
+  if (descriptor < 0) fail(path, errno);
+  close(descriptor);
+}
+
+// The whole of a small file of proc(5); none when the thread ends or is gone.
 std::optional<std::string> contentOf(pid_t thread, const char* file) {
   const std::string path = "/proc/self/task/" + std::to_string(thread) + '/' + file;
   const int descriptor = open(path.c_str(), O_RDONLY | O_CLOEXEC);
   if (descriptor < 0) {
-    if (errno == ENOENT || errno == ESRCH) return std::nullopt;
-    throw std::runtime_error("Cannot tell whether a thread waits: " + path + " cannot be opened.");
+    const int reason = errno;
+    if (reason != ENOENT && reason != ESRCH && reason != EACCES) fail(path, reason);
+    if (reason == EACCES) requireThatTheProcessIsOpen();
+    return std::nullopt;
   }
   std::array<char, 4096> buffer;
   const ssize_t length = read(descriptor, buffer.data(), buffer.size());
