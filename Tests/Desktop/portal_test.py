@@ -42,7 +42,7 @@ class ADialog(unittest.TestCase):
         self.assertEqual(self.alert.stdout.readline(), f"shown by portal ({BACKEND})\n")
         self.allow = until(lambda: widget(self.backend, "Allow"), "the dialog")
         self.window = until(self.windows, "its number")[-1]
-        until(lambda: xdotool("getactivewindow").strip() == self.window, "the focus")
+        until(lambda: xdotool("getactivewindow", check=False).strip() == self.window, "the focus")
 
     def start(self, front_end, **environment):
         alert = subprocess.Popen([PROGRAM, front_end, TITLE, HELPER], stdin=subprocess.PIPE, stdout=subprocess.PIPE, text=True,
