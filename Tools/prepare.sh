@@ -2,7 +2,8 @@
 # Sourced by ./run, ./test and ./bench: installs what is missing, builds a preset, and says in short lines what is being done.
 #
 # Expects `set -euo pipefail` and the project's folder as working directory. A step's whole output stands in
-# build/logs/STEP.log; the terminal sees it when the step fails, or as it comes when PALISADE_VERBOSE is 1.
+# build/logs/STEP.log, or in another folder that `logs` names; the terminal sees it when the step fails, or as it comes when
+# PALISADE_VERBOSE is 1.
 
 say() { printf '%s\n' "$*"; }
 
@@ -16,9 +17,9 @@ under=()
 
 # step NAME SENTENCE COMMAND...: runs the command, says what it does and how long that took.
 step() {
-  local log="build/logs/$1.log" sentence=$2 started=$SECONDS
+  local log="${logs:-build/logs}/$1.log" sentence=$2 started=$SECONDS
   shift 2
-  mkdir -p build/logs
+  mkdir -p "${log%/*}"
   if [ "${PALISADE_VERBOSE:-0}" = 1 ]; then
     say "$sentence"
     "${under[@]}" "$@" || fail "Failed: $sentence"
