@@ -22,7 +22,7 @@ class SystemAlert;
 
 /// The number of this binary interface: everything under Platform/. It goes up when a virtual function is inserted, removed or
 /// changed, or a structure changes its layout; a daemon and a plug-in work together only when their numbers are equal.
-inline constexpr std::uint32_t AccountAccessPluginABINumber = 1;
+inline constexpr std::uint32_t AccountAccessPluginABINumber = 2;
 
 struct PlatformServices {
   std::uint32_t abiNumber = AccountAccessPluginABINumber;

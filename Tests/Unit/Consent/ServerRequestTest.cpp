@@ -201,7 +201,10 @@ TEST_F(AMissingMasterToken, IsNotFoundUnderTheClientsOwnID) {
 class AServerThatCannotBeReached : public ::testing::Test, protected ConsentScene {};
 
 TEST_F(AServerThatCannotBeReached, RefusesWithTheTransportsErrorAsItCame) {
-  const Error error{.domain = "org.example.network", .code = -3, .description = "No route to %@"};
+  const Error error{.domain = "org.example.network",
+                    .code = -3,
+                    .description = "No route to %@",
+                    .furtherInfo = {{"host", "graph.example.org"}, {"attempts", 3}}};
   const std::pair<ServerAnswer, std::optional<Error>> cases[] = {
       {{.error = error}, error},
       {{.data = R"({"access_token": "T"})", .error = error}, error},

@@ -46,7 +46,7 @@ TEST(ANewAuthorization, GrantsNothing) {
   EXPECT_THAT(record.grantedPermissions(), IsNull());
 }
 
-TEST(TwoErrors, AreEqualWhenDomainCodeAndDescriptionAre) {
+TEST(TwoErrors, AreEqualWhenAllThatTheyCarryIs) {
   const Error error{.domain = "D", .code = 1, .description = "text"};
 
   EXPECT_EQ(error, (Error{.domain = "D", .code = 1, .description = "text"}));
@@ -55,6 +55,8 @@ TEST(TwoErrors, AreEqualWhenDomainCodeAndDescriptionAre) {
   EXPECT_NE(error, (Error{.domain = "D", .code = 1, .description = "other"}));
   EXPECT_NE(error, (Error{.domain = "D", .code = 1}));
   EXPECT_NE((Error{.domain = "D", .code = 1, .description = ""}), (Error{.domain = "D", .code = 1}));
+  EXPECT_NE((Error{.domain = "D", .code = 1, .furtherInfo = {{"host", "a"}}}),
+            (Error{.domain = "D", .code = 1, .furtherInfo = {{"host", "b"}}}));
 }
 
 TEST(PermissionNames, AreToldApartByTheirBytes) {

@@ -50,9 +50,9 @@ inline auto isGrant() { return ::testing::FieldsAre(true, ::testing::Eq(std::nul
 inline auto isRefusalWithoutError() { return ::testing::FieldsAre(false, ::testing::Eq(std::nullopt)); }
 inline auto isRefusalWith(Error error) { return ::testing::FieldsAre(false, ::testing::Optional(std::move(error))); }
 inline auto isUnexpectedFailureAnswer() {
-  return ::testing::FieldsAre(
-      false, ::testing::Optional(::testing::FieldsAre(std::string(AccountsErrorDomain), int{AccountsErrorUnexpectedFailure},
-                                                      ::testing::Optional(::testing::Not(::testing::IsEmpty())))));
+  return ::testing::FieldsAre(false, ::testing::Optional(::testing::FieldsAre(
+                                         std::string(AccountsErrorDomain), int{AccountsErrorUnexpectedFailure},
+                                         ::testing::Optional(::testing::Not(::testing::IsEmpty())), ::testing::IsEmpty())));
 }
 
 /// A log record without its source file and line.
