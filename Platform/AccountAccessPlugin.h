@@ -9,7 +9,7 @@
 /// Ownership: plug-in objects are shared; a pending callback keeps its object alive. Accounts, clients and stores that are
 /// handed in live at least until the completion has been called. Errors: an operation never throws and calls its completion
 /// exactly once. "Access denied" is an answer; whatever fails unexpectedly, in the plug-in or in a service, is answered with
-/// (false, `AccountsErrorUnexpectedFailure`).
+/// (false, `AccountsErrorUnexpectedFailure`), unless the outcome has been stored: then the answer is what was stored.
 
 #include <cstdint>
 #include <functional>

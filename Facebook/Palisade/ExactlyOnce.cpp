@@ -20,9 +20,18 @@ std::string messageOf(const std::exception_ptr& failure) {
   }
 }
 
+// Made once and never destroyed: other threads may need it while the process ends.
+const std::optional<Error>& preparedError() {
+  static const auto& error =
+      *new const std::optional<Error>(Error{.domain = std::string(AccountsErrorDomain),
+                                            .code = AccountsErrorUnexpectedFailure,
+                                            .description = "The access decision failed unexpectedly: out of memory"});
+  return error;
+}
+
 class Answer {
  public:
-  Answer(AccessCompletion completion, Log& log, LogPlace operation)
+  Answer(AccessCompletion completion, Log& log, LogPlace operation) noexcept
       : _completion(std::move(completion)),
         _log(log),
         _operation(operation) {}
@@ -31,10 +40,7 @@ class Answer {
   Answer& operator=(const Answer&) = delete;
 
   ~Answer() {
-    if (_isGiven.load(std::memory_order_acquire)) return;
-    const auto dropped = std::make_exception_ptr(std::runtime_error("a service dropped its callback without calling it"));
-    logUnexpectedFailure(_log, _operation, dropped);
-    give(false, unexpectedFailure(dropped));
+    if (!_isGiven.load(std::memory_order_acquire)) fail(droppedCallback());
   }
 
   void give(bool granted, const std::optional<Error>& error) noexcept {
@@ -44,6 +50,11 @@ class Answer {
     } catch (...) {
       logUnexpectedFailure(_log, _operation, std::current_exception());
     }
+  }
+
+  void fail(const std::exception_ptr& failure) noexcept {
+    logUnexpectedFailure(_log, _operation, failure);
+    give(false, UnexpectedFailure(failure).error());
   }
 
  private:
@@ -61,14 +72,26 @@ struct FirstAnswer {
 
 }  // namespace
 
-Error unexpectedFailure(const std::exception_ptr& failure) {
-  return {.domain = std::string(AccountsErrorDomain),
-          .code = AccountsErrorUnexpectedFailure,
-          .description = "The access decision failed unexpectedly: " + messageOf(failure)};
+void prepareForFailures() { preparedError(); }
+
+UnexpectedFailure::UnexpectedFailure(const std::exception_ptr& failure) noexcept {
+  try {
+    _own = Error{.domain = std::string(AccountsErrorDomain),
+                 .code = AccountsErrorUnexpectedFailure,
+                 .description = "The access decision failed unexpectedly: " + messageOf(failure)};
+  } catch (...) {
+    // The prepared error serves.
+  }
 }
 
-bool isUnexpectedFailure(const std::optional<Error>& error) {
-  return error && error->domain == AccountsErrorDomain && error->code == AccountsErrorUnexpectedFailure;
+const std::optional<Error>& UnexpectedFailure::error() const noexcept { return _own ? _own : preparedError(); }
+
+std::exception_ptr droppedCallback() noexcept {
+  try {
+    throw std::runtime_error("a service dropped its callback without calling it");
+  } catch (...) {
+    return std::current_exception();
+  }
 }
 
 void logUnexpectedFailure(Log& log, LogPlace operation, const std::exception_ptr& failure) noexcept {
@@ -79,9 +102,20 @@ void logUnexpectedFailure(Log& log, LogPlace operation, const std::exception_ptr
   }
 }
 
-AccessCompletion answerExactlyOnce(AccessCompletion completion, Log& log, LogPlace operation) {
-  auto answer = std::make_shared<Answer>(std::move(completion), log, operation);
-  return [answer = std::move(answer)](bool granted, const std::optional<Error>& error) { answer->give(granted, error); };
+void answerExactlyOnce(AccessCompletion completion, Log& log, LogPlace operation, const AnsweredOperation& body) noexcept {
+  std::shared_ptr<Answer> answer;
+  try {
+    answer = std::make_shared<Answer>(std::move(completion), log, operation);
+  } catch (...) {
+    // Without memory for the answer the completion has not been moved.
+    Answer(std::move(completion), log, operation).fail(std::current_exception());
+    return;
+  }
+  try {
+    body([answer](bool granted, const std::optional<Error>& error) { answer->give(granted, error); });
+  } catch (...) {
+    answer->fail(std::current_exception());
+  }
 }
 
 FacebookRequestHandler takeFirstAnswer(FacebookRequestHandler handle, std::function<void(const std::exception_ptr&)> fail,

@@ -31,19 +31,22 @@ bool VXFacebookAccountAccessPlugin::supportsAccountTypeWithIdentifier(std::strin
 }
 
 VXFacebookAccountAccessPlugin::VXFacebookAccountAccessPlugin(const PlatformServices& services) : AccountAccessPlugin(services) {
+  prepareForFailures();
   _sets._permissionCategories = std::make_shared<const PermissionSet>(
       PermissionSet{VXFacebookPermissionCategoryBasicRead, VXFacebookPermissionCategoryExtendedRead,
                     VXFacebookPermissionCategoryWrite, VXFacebookPermissionCategoryManage});
 }
 
-void VXFacebookAccountAccessPlugin::_runOperation(LogPlace operation, AccessCompletion completion, const Body& body) const {
-  const AccessCompletion answer = answerExactlyOnce(std::move(completion), log(), operation);
+void VXFacebookAccountAccessPlugin::_logStoredRecord(LogPlace operation, const AccountType& accountType, const Client& client,
+                                                     const ClientAuthorization& record) const noexcept {
   try {
-    body(answer);
+    log().logAccessRequest({.accountTypeIdentifier = accountType.identifier(),
+                            .bundleID = client.bundleID(),
+                            .granted = record.isGranted(),
+                            .userPrompted = false,
+                            .elapsedSeconds = 0.0});
   } catch (...) {
-    const auto failure = std::current_exception();
-    logUnexpectedFailure(log(), operation, failure);
-    answer(false, unexpectedFailure(failure));
+    logUnexpectedFailure(log(), operation, std::current_exception());
   }
 }
 
@@ -53,9 +56,10 @@ void VXFacebookAccountAccessPlugin::handleAccessRequestToAccountsOfType(std::sha
                                                                         std::shared_ptr<AccountStore> store,
                                                                         bool /*allowUserInteraction*/,
                                                                         AccessCompletion completion) {
-  _runOperation(handleAccessRequest, std::move(completion), [&](const AccessCompletion& answer) {
+  const auto decide = [&](const AccessCompletion& answer) {
     _decideAccessRequest(accountType, forClient, withOptions.get(), store, answer);
-  });
+  };
+  answerExactlyOnce(std::move(completion), log(), handleAccessRequest, std::ref(decide));
 }
 
 void VXFacebookAccountAccessPlugin::_decideAccessRequest(const std::shared_ptr<const AccountType>& accountType,

@@ -12,7 +12,8 @@
 /// completions run on the calling thread before the operation returns.
 /// Ownership: made by the module's entry point and shared; a pending callback keeps the object alive.
 /// Errors: only completions carry errors. Missing data is answered with empty results inside the plug-in. A service that throws
-/// ends the operation with (false, `AccountsErrorUnexpectedFailure`): never with a grant, and never without an answer.
+/// ends the operation with (false, `AccountsErrorUnexpectedFailure`): never with a grant, and never without an answer. So does
+/// memory that runs out. Once a record is stored, the answer is what was stored, whatever throws then.
 ///
 /// Operations with a leading underscore are the object's own. Contents, in the order of the sibling files:
 ///   1 Access requests        VXFacebookAccountAccessPlugin.cpp
@@ -30,6 +31,7 @@
 ///  13 Revocation             VXFacebookAccountAccessPluginRevocation.cpp
 /// The module's entry point is in VXFacebookAccountAccessPluginModule.cpp.
 
+#include <exception>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -132,7 +134,7 @@ class VXFacebookAccountAccessPlugin : public AccountAccessPlugin {
                                                       const std::optional<std::string>& audience) const;
   std::optional<std::string> _userObjectsRequestedByPermissions(const PermissionSet& permissions) const;
   std::optional<std::string> _friendObjectsRequestedByPermissions(const PermissionSet& permissions) const;
-  /// `forObjectNames` holds at least one name.
+  /// The names as a list, in one text; a list of no names has empty places.
   std::string _commaSeparatedListWithFormat(std::string_view formatKey, const ObjectNames& forObjectNames) const;
   std::string _objectNameForReadPermission(std::string_view permission) const;
   std::string _objectNameForManagePermission(std::string_view permission) const;
@@ -202,11 +204,6 @@ class VXFacebookAccountAccessPlugin : public AccountAccessPlugin {
                                 const std::optional<std::string>& usingAccessToken) const;
 
  private:
-  using Body = std::function<void(const AccessCompletion& completion)>;
-
-  /// Runs an operation of the daemon's interface: lets no exception out and has the completion called exactly once.
-  void _runOperation(LogPlace operation, AccessCompletion completion, const Body& body) const;
-
   void _decideAccessRequest(const std::shared_ptr<const AccountType>& accountType, const std::shared_ptr<const Client>& client,
                             const Dictionary* options, const std::shared_ptr<AccountStore>& store,
                             const AccessCompletion& completion) const;
@@ -214,6 +211,18 @@ class VXFacebookAccountAccessPlugin : public AccountAccessPlugin {
                                         const std::optional<std::string>& audience,
                                         const PermissionSet& requestedPermissions) const;
 
+  /// Writes the access-request record of a changed record that is in the store. A failure is logged and changes nothing.
+  void _logStoredRecord(LogPlace operation, const AccountType& accountType, const Client& client,
+                        const ClientAuthorization& record) const noexcept;
+
+  using ExchangeFailure = std::function<void(const std::exception_ptr& failure)>;
+
+  /// The exchange behind `_getServerAuthorizationForClient`. What the plug-in or a service throws while the answer is dealt
+  /// with goes to `fail`, so that nobody takes it for an error that the framework delivered.
+  void _exchangeWithServer(const std::shared_ptr<const Client>& client, const std::string& appID,
+                           const PermissionSetRef& permissions, const std::optional<std::string>& audience,
+                           const std::shared_ptr<Account>& account, ServerAuthorizationCompletion completion,
+                           ExchangeFailure fail) const;
   void _handleAuthorizationAnswer(const std::optional<std::string>& data, const std::optional<Error>& error,
                                   const std::shared_ptr<const Client>& client, const std::shared_ptr<Account>& account,
                                   const ServerAuthorizationCompletion& completion) const;

@@ -1,11 +1,10 @@
 // Direct authorization: the daemon grants a client access without asking the user.
 //
 // A record with an app ID gets a fresh token first, and the calling thread waits for it. The daemon has decided already, so a
-// server that refuses or cannot be reached still leads to a grant, with whatever it delivered; only a failure of the plug-in or
-// of a service ends without one.
+// server that refuses or cannot be reached still leads to a grant, with whatever it delivered, whatever error it names. Only
+// what is thrown before the record is stored ends without one.
 
-#include <future>
-
+#include "Facebook/Palisade/AwaitedAnswer.h"
 #include "Facebook/Palisade/ExactlyOnce.h"
 #include "Facebook/Palisade/PermissionSetAlgebra.h"
 #include "Facebook/Palisade/StoredAppID.h"
@@ -14,7 +13,6 @@
 #include "Platform/AccountType.h"
 #include "Platform/AuthorizationManager.h"
 #include "Platform/Client.h"
-#include "Platform/Format.h"
 
 namespace palisade {
 namespace {
@@ -27,7 +25,7 @@ void VXFacebookAccountAccessPlugin::authorizeAccessToAccountsOfType(std::shared_
                                                                     std::shared_ptr<const Client> forClient,
                                                                     std::shared_ptr<AccountStore> store,
                                                                     AccessCompletion completion) {
-  _runOperation(authorizeAccess, std::move(completion), [&](const AccessCompletion& answer) {
+  const auto authorize = [&](const AccessCompletion& answer) {
     const auto account = _accountOfType(accountType, *store);
     if (account == nullptr) {
       answer(false, std::nullopt);
@@ -51,31 +49,25 @@ void VXFacebookAccountAccessPlugin::authorizeAccessToAccountsOfType(std::shared_
     record->setIsGranted(true);
     record->setGrantedPermissions(grantedPermissions);
     const std::optional<Error> error = authorizations.setAuthorization(*record, forClient, *accountType);
-    log().logAccessRequest({.accountTypeIdentifier = accountType->identifier(),
-                            .bundleID = forClient->bundleID(),
-                            .granted = record->isGranted(),
-                            .userPrompted = false,
-                            .elapsedSeconds = 0.0});
+    _logStoredRecord(authorizeAccess, *accountType, *forClient, *record);
     answer(!error.has_value(), error);
-  });
+  };
+  answerExactlyOnce(std::move(completion), log(), authorizeAccess, std::ref(authorize));
 }
 
 PermissionSetRef VXFacebookAccountAccessPlugin::_permissionsGrantedByServer(const std::shared_ptr<const Client>& client,
                                                                             const std::string& appID,
                                                                             const std::shared_ptr<Account>& account) const {
-  auto granted = std::make_shared<std::promise<PermissionSetRef>>();
-  auto answer = granted->get_future();
-  // Only the callback holds the promise: if it is dropped uncalled, the wait ends with an exception.
-  _getServerAuthorizationForClient(
+  auto granted = std::make_shared<AwaitedAnswer<PermissionSetRef>>();
+  auto answer = granted->future();
+  auto fail = [granted](const std::exception_ptr& failure) { granted->fail(failure); };
+  _exchangeWithServer(
       client, appID, nullptr, std::nullopt, account,
-      [granted = std::move(granted)](bool, const std::optional<Array>& permissions, const std::optional<Error>& error) {
-        if (isUnexpectedFailure(error)) {
-          granted->set_exception(std::make_exception_ptr(std::runtime_error(error->description.value_or(describe(*error)))));
-        } else {
-          granted->set_value(
-              std::make_shared<const PermissionSet>(permissions ? permissionSetFromArray(*permissions) : PermissionSet()));
-        }
-      });
+      [granted = std::move(granted)](bool, const std::optional<Array>& permissions, const std::optional<Error>&) {
+        granted->bring(
+            std::make_shared<const PermissionSet>(permissions ? permissionSetFromArray(*permissions) : PermissionSet()));
+      },
+      std::move(fail));
   return answer.get();
 }
 

@@ -116,6 +116,7 @@ std::string VXFacebookAccountAccessPlugin::_commaSeparatedListWithFormat(std::st
   }
   list.insert(list.end(), remaining.begin(), remaining.end());
 
+  if (list.empty()) return formatText(multipleFormat, {"", ""});
   const std::string lastName = list.back();
   std::erase(list, lastName);
   return formatText(multipleFormat, {joined(list, _localizedString("WORD_LIST_SEPARATOR")), lastName});

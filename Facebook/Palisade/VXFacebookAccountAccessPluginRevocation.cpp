@@ -4,6 +4,7 @@
 // waits for the invalidation. The completion always says that the revocation was handled; what a service refuses is the
 // service's care.
 
+#include "Facebook/Palisade/ExactlyOnce.h"
 #include "Facebook/Palisade/StoredAppID.h"
 #include "Facebook/Palisade/VXFacebookAccountAccessPlugin.h"
 #include "Platform/AccountStore.h"
@@ -29,12 +30,13 @@ void VXFacebookAccountAccessPlugin::revokeAccessToAccountsOfType(std::shared_ptr
                                                                  std::shared_ptr<const Client> forClient,
                                                                  std::shared_ptr<AccountStore> store,
                                                                  AccessCompletion completion) {
-  _runOperation(revokeAccess, std::move(completion), [&](const AccessCompletion& answer) {
+  const auto revoke = [&](const AccessCompletion& answer) {
     if (const auto account = _accountOfType(accountType, *store)) {
       _revokeAccess(*accountType, forClient, account, store->authorizationManager());
     }
     answer(true, std::nullopt);
-  });
+  };
+  answerExactlyOnce(std::move(completion), log(), revokeAccess, std::ref(revoke));
 }
 
 void VXFacebookAccountAccessPlugin::_revokeAccess(const AccountType& accountType, const std::shared_ptr<const Client>& client,
@@ -59,17 +61,13 @@ void VXFacebookAccountAccessPlugin::_revokeAccess(const AccountType& accountType
   record->setIsGranted(false);
   record->setGrantedPermissions(nullptr);
   authorizations.setAuthorization(*record, client, accountType);
-  log().logAccessRequest({.accountTypeIdentifier = accountType.identifier(),
-                          .bundleID = client->bundleID(),
-                          .granted = record->isGranted(),
-                          .userPrompted = false,
-                          .elapsedSeconds = 0.0});
+  _logStoredRecord(revokeAccess, accountType, *client, *record);
 }
 
 void VXFacebookAccountAccessPlugin::revokeAllAccessToAccountsOfType(std::shared_ptr<const AccountType> accountType,
                                                                     std::shared_ptr<AccountStore> store,
                                                                     AccessCompletion withCompletion) {
-  _runOperation(revokeAllAccess, std::move(withCompletion), [&](const AccessCompletion& answer) {
+  const auto revokeAll = [&](const AccessCompletion& answer) {
     const auto account = _accountOfType(accountType, *store);
     if (account == nullptr) {
       log().record(revokeAllAccess, LogLevel::error, "No Facebook account. What?", "");
@@ -98,7 +96,8 @@ void VXFacebookAccountAccessPlugin::revokeAllAccessToAccountsOfType(std::shared_
     }
     authorizations.removeAllClientAuthorizationsForAccountType(*accountType);
     answer(true, std::nullopt);
-  });
+  };
+  answerExactlyOnce(std::move(withCompletion), log(), revokeAllAccess, std::ref(revokeAll));
 }
 
 }  // namespace palisade

@@ -27,6 +27,11 @@ const Value* member(const Value& answer, std::string_view name) {
   return answer.dictionary() == nullptr ? nullptr : answer.dictionary()->find(name);
 }
 
+// Text for people.
+std::string reasonForPeople(const Value* reason) {
+  return reason == nullptr ? std::string(NoneRendering) : describe(*reason);
+}
+
 }  // namespace
 
 std::optional<std::string> VXFacebookAccountAccessPlugin::_serverAudienceStringForAudience(
@@ -49,6 +54,17 @@ void VXFacebookAccountAccessPlugin::_getServerAuthorizationForClient(const std::
                                                                      const std::optional<std::string>& audience,
                                                                      const std::shared_ptr<Account>& account,
                                                                      ServerAuthorizationCompletion completion) const {
+  auto fail = [completion](const std::exception_ptr& failure) {
+    completion(false, std::nullopt, UnexpectedFailure(failure).error());
+  };
+  _exchangeWithServer(client, withAppID, permissions, audience, account, std::move(completion), std::move(fail));
+}
+
+void VXFacebookAccountAccessPlugin::_exchangeWithServer(const std::shared_ptr<const Client>& client, const std::string& appID,
+                                                        const PermissionSetRef& permissions,
+                                                        const std::optional<std::string>& audience,
+                                                        const std::shared_ptr<Account>& account,
+                                                        ServerAuthorizationCompletion completion, ExchangeFailure fail) const {
   const std::optional<std::string> bundleID = client->bundleID();
   if (!bundleID) {
     completion(false, std::nullopt,
@@ -59,7 +75,7 @@ void VXFacebookAccountAccessPlugin::_getServerAuthorizationForClient(const std::
   }
 
   const auto request =
-      social().makeFacebookAuthorizationRequest(withAppID, *bundleID, permissions, _serverAudienceStringForAudience(audience));
+      social().makeFacebookAuthorizationRequest(appID, *bundleID, permissions, _serverAudienceStringForAudience(audience));
   const std::optional<std::string> masterToken = _masterTokenForAccount(account);
   if (!masterToken || masterToken->empty()) {
     log().record(getServerAuthorization, LogLevel::error,
@@ -68,7 +84,6 @@ void VXFacebookAccountAccessPlugin::_getServerAuthorizationForClient(const std::
   request->setAccessToken(masterToken);
 
   // Only the handler holds the completion: if the framework drops the handler, the daemon is answered with a refusal.
-  auto fail = [completion](const std::exception_ptr& failure) { completion(false, std::nullopt, unexpectedFailure(failure)); };
   request->performRequestWithHandler(takeFirstAnswer(
       [this, keepAlive = shared_from_this(), client, account, completion = std::move(completion)](
           const std::optional<std::string>& data, const std::optional<HttpResponse>&, const std::optional<Error>& error) {
@@ -103,8 +118,8 @@ void VXFacebookAccountAccessPlugin::_handleAuthorizationAnswer(const std::option
     const Value* reason = member(answer, "error_msg");
     completion(
         false, std::nullopt,
-        describedError(AccountsErrorAccessDenied, formatText("The Facebook server could not fulfill this access request: %@",
-                                                             {describe(LogArgument(reason))})));
+        describedError(AccountsErrorAccessDenied,
+                       formatText("The Facebook server could not fulfill this access request: %@", {reasonForPeople(reason)})));
     return;
   }
   _saveCredentialForClient(client, account, *token->string());

@@ -3,8 +3,7 @@
 // The calling thread waits for the server, with no time-out of its own: the transport ends what takes too long. Whatever is no
 // description (an error, a body of another form, the server's own "cannot describe") takes the whole message away.
 
-#include <future>
-
+#include "Facebook/Palisade/AwaitedAnswer.h"
 #include "Facebook/Palisade/ExactlyOnce.h"
 #include "Facebook/Palisade/VXFacebookAccountAccessPlugin.h"
 #include "Platform/Format.h"
@@ -40,14 +39,13 @@ std::optional<std::string> VXFacebookAccountAccessPlugin::_fetchDescriptionForUn
       social().makeFacebookPermissionDescriptionRequest(permissions, _serverAudienceStringForAudience(audience));
   request->setAccessToken(_masterTokenForAccount(account));
 
-  // Only the handler holds the promise: if the framework drops the handler, the wait ends with an exception.
-  auto description = std::make_shared<std::promise<std::optional<std::string>>>();
-  auto answer = description->get_future();
-  auto fail = [description](const std::exception_ptr& failure) { description->set_exception(failure); };
+  auto description = std::make_shared<AwaitedAnswer<std::optional<std::string>>>();
+  auto answer = description->future();
+  auto fail = [description](const std::exception_ptr& failure) { description->fail(failure); };
   request->performRequestWithHandler(takeFirstAnswer(
       [this, keepAlive = shared_from_this(), permissions, description = std::move(description)](
           const std::optional<std::string>& data, const std::optional<HttpResponse>&, const std::optional<Error>& error) {
-        description->set_value(_descriptionFromAnswer(data, error, permissions));
+        description->bring(_descriptionFromAnswer(data, error, permissions));
       },
       std::move(fail), log(), fetchDescription));
   return answer.get();

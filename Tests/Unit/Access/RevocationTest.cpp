@@ -161,6 +161,15 @@ TEST(ARevocation, SaysThatItWasHandledAlsoWhenStoreAndKeychainRefuse) {
   EXPECT_EQ(scene.record(), grantedToFriends);
 }
 
+TEST(ARevocation, IsHandledOnceTheRecordIsClearedEvenIfNobodyCanWriteThatDown) {
+  Scene scene;
+  scene.addAccount();
+  scene.addRecord(grantedToFriends);
+  scene.platform.faults.throwOn("Log.logAccessRequest");
+  EXPECT_THAT(scene.revoke(), isGrant());
+  EXPECT_EQ(scene.record(), cleared);
+}
+
 TEST(ARevocation, LeavesOtherClientsAndOtherAccountsAlone) {
   Scene scene;
   scene.addAccount("first");

@@ -22,7 +22,7 @@ INSTANTIATE_TEST_SUITE_P(, EveryOtherAccountType,
                          ::testing::Values("", "com.veltran.accounttype.faceboo", "com.veltran.accounttype.facebook2",
                                            "com.veltran.accounttype.Facebook", " com.veltran.accounttype.facebook",
                                            "com.veltran.accounttype.facebook\n", "com.veltran.accounttype.facebook\0"sv,
-                                           "com.veltran.accounttype.twitter", "AccountTypeIdentifierFacebook", "%@"));
+                                           "com.veltran.accounttype.other", "AccountTypeIdentifierFacebook", "%@"));
 
 }  // namespace
 }  // namespace palisade

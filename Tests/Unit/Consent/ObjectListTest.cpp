@@ -63,6 +63,7 @@ TEST_F(AnObjectList, FormsTheKeyForSeveralNamesFromTheKeyForOne) {
 
   EXPECT_EQ(plugin->_commaSeparatedListWithFormat("ANYTHING", {"a"}), "one: a");
   EXPECT_EQ(plugin->_commaSeparatedListWithFormat("ANYTHING", {"a", "b"}), "several: a / b");
+  EXPECT_EQ(plugin->_commaSeparatedListWithFormat("ANYTHING", {}), "several:  / ");
 }
 
 class AnObjectName : public ::testing::Test, protected ConsentScene {};
