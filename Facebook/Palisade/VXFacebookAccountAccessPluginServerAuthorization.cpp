@@ -27,9 +27,9 @@ const Value* member(const Value& answer, std::string_view name) {
   return answer.dictionary() == nullptr ? nullptr : answer.dictionary()->find(name);
 }
 
-// Text for people.
+// A null that was sent says as little as a member that was left out.
 std::string reasonForPeople(const Value* reason) {
-  return reason == nullptr ? std::string(NoneRendering) : describe(*reason);
+  return reason == nullptr || reason->isNull() ? std::string(NoneRendering) : describe(*reason);
 }
 
 }  // namespace

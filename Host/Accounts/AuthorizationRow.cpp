@@ -12,7 +12,7 @@ namespace palisade {
 namespace {
 
 // Options come over the bus, whose own limit on nesting is far below this.
-const NlohmannJsonParser parser(NlohmannJsonParser::greatestDepth);
+const NlohmannJsonParser parser(NlohmannJsonParser::greatestDepth, NullCharacters::refused);
 
 std::string writtenFaithfully(const Value& value, std::string_view what) {
   if (!survivesJson(value, NlohmannJsonParser::greatestDepth)) {

@@ -71,7 +71,7 @@ std::optional<std::uint32_t> lengthOfAlertQuestion(std::string_view fourBytes) {
 }
 
 std::optional<AlertQuestion> alertQuestionFromJson(std::string_view json) {
-  const auto parsed = NlohmannJsonParser(4).parse(json, JsonFragments::refused);
+  const auto parsed = NlohmannJsonParser(4, NullCharacters::refused).parse(json, JsonFragments::refused);
   const Dictionary* object = parsed.value ? parsed.value->dictionary() : nullptr;
   if (object == nullptr) return std::nullopt;
 

@@ -24,13 +24,13 @@ enum JsonErrorCode : int {
   JsonErrorNotUtf8 = 2,           ///< a byte sequence that is not UTF-8
   JsonErrorTooDeep = 3,           ///< arrays and objects nested deeper than the limit
   JsonErrorDuplicateName = 4,     ///< a name that occurs twice in one object, whichever way each one is escaped
-  JsonErrorNullCharacter = 5,     ///< U+0000, as a byte anywhere or escaped in a string or name
+  JsonErrorNullCharacter = 5,     ///< U+0000 as a byte; escaped in a string or name where null characters are refused
   JsonErrorFragment = 6,          ///< neither an object nor an array at the top, and fragments are refused
   JsonErrorEmpty = 7,             ///< nothing, or white space only
   JsonErrorNumberOutOfRange = 8,  ///< a number that no finite double comes near, such as 1e400
 };
 
-/// Whether an escaped U+0000 may stand in a string. Text that goes on to a terminal, a log or a C library must not hold one.
+/// Whether an escaped U+0000 may stand in a string or a name. Documents of our own never hold one and refuse it.
 enum class NullCharacters { refused, accepted };
 
 /// The parser that the daemon hands to its plug-ins.
@@ -43,7 +43,7 @@ class NlohmannJsonParser final : public JsonParser {
   static constexpr std::size_t greatestDepth = 512;
 
   /// Accepts arrays and objects nested `maximumDepth` deep, at most `greatestDepth`. With 0 only a bare value is accepted.
-  explicit NlohmannJsonParser(std::size_t maximumDepth = 32, NullCharacters nullCharacters = NullCharacters::refused);
+  explicit NlohmannJsonParser(std::size_t maximumDepth = 32, NullCharacters nullCharacters = NullCharacters::accepted);
 
   JsonParseResult parse(std::string_view data, JsonFragments fragments) const override;
 
@@ -55,8 +55,8 @@ class NlohmannJsonParser final : public JsonParser {
 /// The value as compact JSON on one line. Bytes that are not UTF-8 become U+FFFD, numbers that are not finite become null.
 std::string writeJson(const Value& value);
 
-/// Whether a parser that accepts `maximumDepth` levels reads what `writeJson` writes as an equal value: that holds no bytes
-/// that are not UTF-8, no number that is not finite, no U+0000, and no level more.
+/// Whether a parser that accepts `maximumDepth` levels and no null characters reads what `writeJson` writes as an equal value:
+/// that holds no bytes that are not UTF-8, no number that is not finite, no U+0000, and no level more.
 bool survivesJson(const Value& value, std::size_t maximumDepth);
 
 }  // namespace palisade

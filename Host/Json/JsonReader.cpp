@@ -3,7 +3,7 @@
 /// Reading: the library splits the text into events, and a builder makes them a Value.
 ///
 /// What a server sends is hostile until it has been read. So nothing here recurses, nesting is counted before a level is
-/// opened, and what the library would accept in silence is refused: a name that occurs twice, U+0000 (which it takes for the
+/// opened, and what the library would accept in silence is refused: a name that occurs twice, a byte 0 (which it takes for the
 /// end of the text when it stands outside a string), a number that became infinite. The library's own messages quote the text
 /// around an error; they are matched against known phrases and only the texts below are passed on.
 

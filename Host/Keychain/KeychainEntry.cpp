@@ -12,7 +12,7 @@ constexpr const char* refreshTokenKey = "refreshToken";
 constexpr const char* expiryDateKey = "expiryDate";
 
 std::optional<Dictionary> read(std::string_view text) {
-  const JsonParseResult result = NlohmannJsonParser(1).parse(text, JsonFragments::refused);
+  const JsonParseResult result = NlohmannJsonParser(1, NullCharacters::refused).parse(text, JsonFragments::refused);
   if (!result.value || result.value->dictionary() == nullptr) return std::nullopt;
   return *result.value->dictionary();
 }

@@ -148,8 +148,6 @@ TEST(TheJsonParser, RefusesWithTheCodeAndThePlace) {
       {"\"a\0b\""s, JsonErrorNullCharacter, 1, 3},
       {"[1]\0garbage"s, JsonErrorNullCharacter, 1, 4},
       {"[1]\0"s, JsonErrorNullCharacter, 1, 4},
-      {R"("a\u0000b")", JsonErrorNullCharacter, 1, 10},
-      {R"({"\u0000":1})", JsonErrorNullCharacter, 1, 9},
       {R"({"a":1,"b":2,"a":3})", JsonErrorDuplicateName, 1, 16},
       {R"({"a":1,"\u0061":3})", JsonErrorDuplicateName, 1, 15},
       {R"({"a":{"":1,"":1}})", JsonErrorDuplicateName, 1, 13},
@@ -213,11 +211,21 @@ TEST(ABareValue, IsRefusedWhereFragmentsAre) {
   }
 }
 
-TEST(AParserThatAcceptsNullCharacters, KeepsThemInStringsAndNames) {
-  const NlohmannJsonParser parser(32, NullCharacters::accepted);
-  const auto parsed = parser.parse(R"({"a\u0000b": "\u0000"})", JsonFragments::allowed);
+TEST(AnEscapedNullCharacter, IsKeptInStringsAndNamesLikeAnyOther) {
+  const auto parsed = parse(R"({"a\u0000b": "\u0000"})");
   ASSERT_TRUE(parsed.value);
   const Value* entry = parsed.value->dictionary()->find(std::string_view("a\0b", 3));
   ASSERT_NE(entry, nullptr);
   EXPECT_EQ(*entry, Value(std::string(1, '\0')));
+}
+
+TEST(AnEscapedNullCharacter, IsRefusedWhereItMayNotStand) {
+  const NlohmannJsonParser parser(32, NullCharacters::refused);
+  const std::pair<const char*, std::size_t> cases[] = {{R"("a\u0000b")", 10}, {R"({"\u0000":1})", 9}};
+  for (const auto& [text, column] : cases) {
+    const JsonParseResult result = parser.parse(text, JsonFragments::allowed);
+    EXPECT_EQ(result.value, std::nullopt);
+    ASSERT_EQ(codeOf(result), JsonErrorNullCharacter);
+    EXPECT_THAT(result.error->description, Optional(StartsWith("Line 1, column " + std::to_string(column) + ": ")));
+  }
 }

@@ -108,7 +108,7 @@ TEST(WrittenJson, OfTheDeepestValueReadsBack) {
 
 TEST(WrittenJson, IsKnownToLoseWhatItLoses) {
   constexpr std::size_t depth = 3;
-  const NlohmannJsonParser parser(depth);
+  const NlohmannJsonParser parser(depth, NullCharacters::refused);
   const Value lost[] = {"\xFF",
                         std::string("a\0b", 3),
                         std::numeric_limits<double>::infinity(),

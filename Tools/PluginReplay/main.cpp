@@ -78,7 +78,7 @@ ScenarioResult carryOut(const std::string& text, const AnnounceID& announceID, c
     return ScenarioResult{.line = writeScenarioError(id, problem), .outcome = ScenarioOutcome::malformed};
   };
   // A scenario may ask what a plug-in makes of U+0000.
-  const NlohmannJsonParser parser(NlohmannJsonParser::greatestDepth, NullCharacters::accepted);
+  const NlohmannJsonParser parser(NlohmannJsonParser::greatestDepth);
   const auto parsed = parser.parse(text, JsonFragments::allowed);
   if (!parsed.value) {
     announceID(std::nullopt);

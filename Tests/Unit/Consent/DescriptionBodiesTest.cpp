@@ -53,7 +53,6 @@ TEST_F(ABodyThatIsNoDescription, MayBeNoJsonAndTheParserSaysWhy) {
       R"("\ud800")",
       "\"line\nbreak\"",
       "\"nul\0inside\""s,
-      R"("nul\u0000inside")",
       "\"\xff\xfe\"",
       "\"\xc0\xaf\"",
       "1e400",
@@ -76,7 +75,7 @@ TEST_F(ABodyThatIsNoDescription, MayBeNestedAHundredThousandDeep) {
 class ADescriptionOfAnyText : public ::testing::Test, protected ConsentScene {};
 
 TEST_F(ADescriptionOfAnyText, IsTakenAsItStands) {
-  const std::pair<const char*, const char*> cases[] = {
+  const std::pair<const char*, std::string> cases[] = {
       {R"("line\nbreak")", "line\nbreak"},
       {R"("\"quoted\"")", "\"quoted\""},
       {R"("\u00e4\ud83d\ude00")", "ä😀"},
@@ -84,10 +83,11 @@ TEST_F(ADescriptionOfAnyText, IsTakenAsItStands) {
       {"\xEF\xBB\xBF\"after a mark\"", "after a mark"},
       {R"(  "padded"  )", "padded"},
       {R"("null")", "null"},
+      {R"("nul\u0000inside")", "nul\0inside"s},
   };
   for (const auto& [body, description] : cases) {
     serverDescribes(body);
-    EXPECT_THAT(fetchDescription(permissionSet({"a"})), Optional(std::string(description)));
+    EXPECT_THAT(fetchDescription(permissionSet({"a"})), Optional(description));
   }
 }
 

@@ -101,7 +101,7 @@ TEST_F(AnAnswer, QuotesTheServersReasonStringsAsTheyAreAndAllElseAsCompactJson) 
       {R"("")", ""},
       {R"("%@ %d")", "%@ %d"},
       {R"("a \"b\"\n")", "a \"b\"\n"},
-      {"null", "null"},
+      {"null", "(null)"},
       {"true", "true"},
       {"190", "190"},
       {"1.50", "1.5"},
@@ -153,7 +153,6 @@ TEST_F(AnAnswer, ThatIsNotJsonIsARefusalWithTheParsersError) {
       R"({"access_token":"T","access_token":"T"})",
       R"({'access_token':'T'})",
       "{\"access_token\":\"\xff\"}",
-      R"({"access_token":"nul\u0000"})",
       "{\"access_token\":\"T\0\"}"s,
       R"({"access_token":"T","number":1e400})",
       R"({"access_token":"T","deep":)" + std::string(100'000, '[') + std::string(100'000, ']') + "}",
@@ -174,6 +173,25 @@ TEST_F(AnAnswer, ThatIsNotJsonIsARefusalWithTheParsersError) {
                                     .argumentNames = "error"}));
     expectNothingStored();
   }
+}
+
+TEST_F(AnAnswer, IsNotSpoiledByANullCharacterInAMemberThatNobodyReads) {
+  EXPECT_THAT(answersTo(R"({"nul\u0000":"\u0000","access_token":"T","permissions":["email"]})"),
+              ElementsAre(isServerGrant(Array{"email"})));
+  const auto stored = platform.keychain.entry("me", "org.example.photos");
+  ASSERT_NE(stored, nullptr);
+  EXPECT_THAT(stored->oauthToken(), Optional(std::string("T")));
+}
+
+TEST_F(AnAnswer, HandsATokenWithANullCharacterToTheKeychainThatRefusesIt) {
+  platform.keychain.refuseWrites(Error{.domain = "keychain", .code = 1});
+  EXPECT_THAT(answersTo(R"({"access_token":"T\u0000T"})"), ElementsAre(isServerGrant(std::nullopt)));
+  EXPECT_THAT(platform.trace.named("KeychainManager.setCredentialForAccount"), SizeIs(1));
+  EXPECT_EQ(platform.keychain.entry("me", "org.example.photos"), nullptr);
+}
+
+TEST_F(AnAnswer, IsReadBehindAByteOrderMark) {
+  EXPECT_THAT(answersTo("\xEF\xBB\xBF{\"access_token\":\"T\"}"), ElementsAre(isServerGrant(std::nullopt)));
 }
 
 TEST_F(AnAnswer, IsReadWhateverTheStatusOfTheHttpResponse) {
