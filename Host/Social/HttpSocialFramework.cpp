@@ -1,5 +1,6 @@
 #include "Host/Social/HttpSocialFramework.h"
 
+#include <mutex>
 #include <stdexcept>
 #include <utility>
 
@@ -35,27 +36,65 @@ void tell(const FacebookRequestHandler& handler, HttpResult result, const std::s
   }
 }
 
+// A request under way, for whoever may cancel it.
+class Cancellation {
+ public:
+  /// Takes the transfer that `cancel` ends. It may have ended already.
+  void applyTo(std::unique_ptr<HttpTransfer> transfer) {
+    const std::lock_guard lock(_mutex);
+    if (_isOver) transfer->letGo();
+    if (!_isCancelled && !_isOver) _transfer = std::move(transfer);
+  }
+
+  void cancel() {
+    const std::lock_guard lock(_mutex);
+    _isCancelled = true;
+    _transfer = nullptr;
+  }
+
+  /// There is nothing left to cancel.
+  void end() {
+    const std::lock_guard lock(_mutex);
+    _isOver = true;
+    if (const auto transfer = std::exchange(_transfer, nullptr)) transfer->letGo();
+  }
+
+ private:
+  std::mutex _mutex;
+  std::unique_ptr<HttpTransfer> _transfer;
+  bool _isCancelled = false;
+  bool _isOver = false;
+};
+
 template <typename Interface>
 class HttpFacebookRequest final : public Interface {
  public:
-  HttpFacebookRequest(HttpClient& http, std::string serverName, RequestMaker make)
+  HttpFacebookRequest(HttpClient& http, std::string serverName, RequestMaker make, const ExchangeWatch& watch,
+                      std::optional<std::string> appID = std::nullopt)
       : _http(http),
         _serverName(std::move(serverName)),
-        _make(std::move(make)) {}
+        _make(std::move(make)),
+        _watch(watch),
+        _appID(std::move(appID)) {}
 
   void setAccessToken(std::optional<std::string> token) override { _token = std::move(token); }
 
   void performRequestWithHandler(FacebookRequestHandler handler) override {
-    _http
-        .send(_make(_token), [handler = std::move(handler),
-                              serverName = _serverName](HttpResult result) { tell(handler, std::move(result), serverName); })
-        ->letGo();
+    const auto cancellation = std::make_shared<Cancellation>();
+    auto watched = _watch ? _watch({.appID = _appID, .cancel = [cancellation] { cancellation->cancel(); }}) : nullptr;
+    cancellation->applyTo(_http.send(_make(_token), [cancellation, watched = std::move(watched), handler = std::move(handler),
+                                                     serverName = _serverName](HttpResult result) {
+      cancellation->end();
+      tell(handler, std::move(result), serverName);
+    }));
   }
 
  private:
   HttpClient& _http;
   const std::string _serverName;
   const RequestMaker _make;
+  const ExchangeWatch _watch;
+  const std::optional<std::string> _appID;
   std::optional<std::string> _token;
 };
 
@@ -77,11 +116,13 @@ class OutboxSession final : public FacebookSession {
 
 }  // namespace
 
-HttpSocialFramework::HttpSocialFramework(HttpClient& http, Outbox& outbox, FacebookServer server, AccountLookup account)
+HttpSocialFramework::HttpSocialFramework(HttpClient& http, Outbox& outbox, FacebookServer server, AccountLookup account,
+                                         ExchangeWatch watch)
     : _http(http),
       _outbox(outbox),
       _server(std::move(server)),
-      _account(std::move(account)) {}
+      _account(std::move(account)),
+      _watch(std::move(watch)) {}
 
 std::shared_ptr<FacebookSession> HttpSocialFramework::makeFacebookSession() {
   return std::make_shared<OutboxSession>(_outbox, _account);
@@ -95,7 +136,8 @@ std::shared_ptr<FacebookAuthorizationRequest> HttpSocialFramework::makeFacebookA
       [server = _server, appID, bundleID, permissions = std::move(permissions),
        audience](const std::optional<std::string>& token) {
         return server.authorization(appID, bundleID, permissions, audience, token);
-      });
+      },
+      _watch, appID);
 }
 
 std::shared_ptr<FacebookPermissionDescriptionRequest> HttpSocialFramework::makeFacebookPermissionDescriptionRequest(
@@ -104,7 +146,8 @@ std::shared_ptr<FacebookPermissionDescriptionRequest> HttpSocialFramework::makeF
       _http, _server.name(),
       [server = _server, permissions = std::move(permissions), audience](const std::optional<std::string>& token) {
         return server.description(permissions, audience, token);
-      });
+      },
+      _watch);
 }
 
 }  // namespace palisade

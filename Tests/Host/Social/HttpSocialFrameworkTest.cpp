@@ -4,8 +4,12 @@
 #include <gtest/gtest.h>
 
 #include <future>
+#include <memory>
 #include <optional>
+#include <stdexcept>
 #include <thread>
+#include <utility>
+#include <vector>
 
 #include "Host/Json/Json.h"
 #include "Host/Vantad/Outbox.h"
@@ -176,6 +180,69 @@ TEST_F(TheSocialFramework, TellsEveryHandlerWhenTheDaemonEnds) {
       perform(framework->makeFacebookAuthorizationRequest("app", "org.example.App", nullptr, std::nullopt), "a token");
   http.reset();
   EXPECT_EQ(told.get().code(), HttpErrorCancelled);
+}
+
+// Whoever watches the exchanges of a framework.
+class AWatchedExchange : public TheSocialFramework {
+ protected:
+  AWatchedExchange() {
+    framework.emplace(
+        *http, outbox, FacebookServer(configuration()), [this] { return account; },
+        [this](Exchange exchange) { return watch(std::move(exchange)); });
+  }
+
+  std::shared_ptr<const void> watch(Exchange exchange) {
+    if (!mayBegin) throw std::runtime_error("It may not begin.");
+    exchanges.push_back(std::move(exchange));
+    if (isCancelledAtOnce) exchanges.back().cancel();
+    return std::shared_ptr<const void>(nullptr, [released = released](const void*) { released->set_value(); });
+  }
+
+  std::future<Told> askForToken() {
+    return perform(framework->makeFacebookAuthorizationRequest("app", "org.example.App", nullptr, std::nullopt),
+                   sandbox.masterToken());
+  }
+
+  bool mayBegin = true;
+  bool isCancelledAtOnce = false;
+  std::vector<Exchange> exchanges;
+  std::shared_ptr<std::promise<void>> released = std::make_shared<std::promise<void>>();
+};
+
+TEST_F(AWatchedExchange, IsToldWithTheAppThatATokenIsAskedFor) {
+  askForToken().get();
+  EXPECT_EQ(exchanges.back().appID, "app");
+}
+
+TEST_F(AWatchedExchange, IsToldWithoutAnAppWhenWordsAreAskedFor) {
+  describe(permissions({"user_runs"}));
+  EXPECT_EQ(exchanges.back().appID, std::nullopt);
+}
+
+TEST_F(AWatchedExchange, IsKeptUntilItsHandlerHasBeenCalled) {
+  askForToken().get();
+  released->get_future().get();
+  exchanges.back().cancel();  // There is nothing left to cancel.
+}
+
+TEST_F(AWatchedExchange, EndsWhenItIsCancelled) {
+  sandbox.arm({{"kind", "silent"}});
+  std::future<Told> told = askForToken();
+  exchanges.back().cancel();
+  EXPECT_EQ(told.get().code(), HttpErrorCancelled);
+  exchanges.back().cancel();
+}
+
+TEST_F(AWatchedExchange, EndsWhenItIsCancelledBeforeItBegins) {
+  isCancelledAtOnce = true;
+  sandbox.arm({{"kind", "silent"}});
+  EXPECT_EQ(askForToken().get().code(), HttpErrorCancelled);
+}
+
+TEST_F(AWatchedExchange, DoesNotBeginWhenTheWatchRefusesIt) {
+  mayBegin = false;
+  EXPECT_THROW(askForToken(), std::runtime_error);
+  EXPECT_THAT(sandbox.requests(), IsEmpty());
 }
 
 // Attack 15: what such a body means is for the daemon's parser to say, and it says no.
