@@ -70,11 +70,14 @@ int tellAnswer(const Output& output, const AccessAnswer& answer) {
   Dictionary object{{"granted", answer.response == AccessAnswer::Response::granted}};
   for (const auto& [key, value] : answer.results) object.set(key, value);
   const std::string reason = shown(answer.results.find("error_message"));
+  const bool isNobodyAsked = shown(answer.results.find("error_domain")).ends_with(".NotAsked");
   switch (answer.response) {
     case AccessAnswer::Response::granted: output.say("Access is granted.", object); return yes;
     case AccessAnswer::Response::withdrawn:
       object.set("withdrawn", true);
-      output.say(reason.empty() ? "Nobody answered. Nothing was recorded; ask again." : "Nobody was asked. " + reason, object);
+      output.say(reason.empty() ? "Nobody answered. Nothing was recorded; ask again."
+                                : (isNobodyAsked ? "Nobody was asked. " : "Nothing was granted. ") + reason,
+                 object);
       return no;
     default: output.say(reason.empty() ? "Access is refused." : "Access is refused: " + reason, object); return no;
   }

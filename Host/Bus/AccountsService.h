@@ -33,6 +33,7 @@ enum class BusFailureKind {
   notGranted,
   tooManyRequests,
   notAsked,
+  accessRevoked,
   keychainUnavailable,
   storeUnavailable,
   failed

@@ -58,6 +58,7 @@ const char* nameOf(BusFailureKind kind) {
     case BusFailureKind::notGranted: return "NotGranted";
     case BusFailureKind::tooManyRequests: return "TooManyRequests";
     case BusFailureKind::notAsked: return "NotAsked";
+    case BusFailureKind::accessRevoked: return "AccessRevoked";
     case BusFailureKind::keychainUnavailable: return "KeychainUnavailable";
     case BusFailureKind::storeUnavailable: return "StoreUnavailable";
     case BusFailureKind::failed: break;
@@ -175,7 +176,9 @@ void BusRequest::fail(const BusFailure& failure) {
       return _result.returnError(error);
     }
   }
-  finish({.response = failure.kind() == BusFailureKind::notAsked ? AccessResponse::withdrawn : AccessResponse::refused,
+  // In neither case has anybody decided about the request.
+  const bool isUndecided = failure.kind() == BusFailureKind::notAsked || failure.kind() == BusFailureKind::accessRevoked;
+  finish({.response = isUndecided ? AccessResponse::withdrawn : AccessResponse::refused,
           .error = Error{.domain = error.getName(), .code = 0, .description = failure.what()}});
 }
 

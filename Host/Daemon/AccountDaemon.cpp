@@ -18,6 +18,7 @@
 #include "Host/Daemon/CrashRepair.h"
 #include "Host/Daemon/HealthChecks.h"
 #include "Host/Daemon/Operation.h"
+#include "Host/Daemon/OperationExchange.h"
 #include "Host/Daemon/OperationKeychain.h"
 #include "Host/Daemon/OperationLog.h"
 #include "Host/Daemon/Paths.h"
@@ -105,7 +106,8 @@ struct AccountDaemon::Parts {
         outbox({.path = stateFolder() / "outbox.sqlite", .onAdd = [this] { bus.start(socialDaemonBusName); }}),
         server(serverConfiguration()),
         http(server.httpOptions()),
-        social(http, outbox, FacebookServer(server), [this] { return firstFacebookAccount(); }),
+        social(
+            http, outbox, FacebookServer(server), [this] { return firstFacebookAccount(); }, watchExchange),
         preferences(configurationFolder() / "preferences"),
         frontEnd({.choice = configuration.alert,
                   .terminal = configuration.terminal,

@@ -62,7 +62,8 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
   });
 
   try {
-    auto turn = _lanes.enter(client->id(), ClientLanes::Bound::kept, [&] { operation->aboutToWait(); });
+    auto turn = _lanes.enter(client->id(), [&] { operation->aboutToWait(); });
+    if (const auto failure = operation->failure()) throw BusFailure(*failure);
     if (operation->isWithdrawn()) return {.response = AccessResponse::withdrawn};
     const auto noteTurn = [&](bool hasTurn) {
       const std::lock_guard lock(_mutex);
@@ -96,7 +97,8 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
 
     if (operation->wasUserAsked()) _parts.history.flush();
     if (operation->hasNotedGrant() && result.response != AccessResponse::granted) {
-      _parts.store.forgetIntent(AccountType(accountType), client->id());
+      // Whoever revoked it has taken the note over.
+      operation->unlessRevoked([&] { return _parts.store.forgetIntent(AccountType(accountType), client->id()); });
     }
     if (!operation->isAnsweredByUser() && result.response != AccessResponse::granted) {
       _parts.store.removeAnswersByNobodyForClient(*client);
@@ -122,7 +124,11 @@ std::string AccountOperations::credential(const BusCaller& caller, const std::st
     throw BusFailure(BusFailureKind::noSuchAccount, "There is no account of the type '" + accountType + "'.");
   try {
     const auto credential = _parts.keychain.credentialForAccount(accounts.front(), client->bundleID());
-    if (client->bundleID() && credential != nullptr && credential->oauthToken()) return *credential->oauthToken();
+    // The keychain may take its time, and the access may have been taken back meanwhile.
+    const auto present = storeCall([&] { return _parts.store.authorizationForClient(client, AccountType(accountType)); });
+    const bool isStillGranted = present != nullptr && present->isGranted();
+    if (isStillGranted && client->bundleID() && credential != nullptr && credential->oauthToken())
+      return *credential->oauthToken();
   } catch (const std::exception& failure) {
     throw BusFailure(BusFailureKind::keychainUnavailable, failure.what());
   }
@@ -152,15 +158,17 @@ void AccountOperations::withdrawAll() {
   withdraw([](const Running&) { return true; });
 }
 
-void AccountOperations::withdraw(const Withdrawable& isMeant) {
+std::vector<std::shared_ptr<Operation>> AccountOperations::operationsThat(const Withdrawable& areMeant) {
   std::vector<std::shared_ptr<Operation>> meant;
-  {
-    const std::lock_guard lock(_mutex);
-    for (const auto& [operation, running] : _running) {
-      if (isMeant(running)) meant.push_back(running.operation);
-    }
+  const std::lock_guard lock(_mutex);
+  for (const auto& [operation, running] : _running) {
+    if (areMeant(running)) meant.push_back(running.operation);
   }
-  for (const auto& operation : meant) operation->withdraw();
+  return meant;
+}
+
+void AccountOperations::withdraw(const Withdrawable& isMeant) {
+  for (const auto& operation : operationsThat(isMeant)) operation->withdraw();
 }
 
 std::shared_ptr<const RegisteredClient> AccountOperations::clientOf(const BusCaller& caller) {

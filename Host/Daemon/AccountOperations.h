@@ -4,7 +4,8 @@
 /// plug-in's.
 ///
 /// Threads: see `AccountsService`. One operation of a client at a time, in order; operations of different clients run beside
-/// each other. A revocation first withdraws what its client waits for. Ownership: borrows its parts. Errors: `BusFailure`.
+/// each other. A revocation waits for no operation: it withdraws those of its client, and what they still bring is not kept.
+/// Ownership: borrows its parts. Errors: `BusFailure`.
 //  Contents: 1 Requests (AccountOperations.cpp)  2 Management (AccountOperationsManagement.cpp)
 
 #include <functional>
@@ -104,7 +105,9 @@ class AccountOperations final : public AccountsService {
                          const std::string& accountType, const std::optional<std::string>& appID, PendingRequest& request,
                          const PluginCall& call);
   void manage(const std::string& accountType, const PluginCall& call);
+  std::vector<std::shared_ptr<Operation>> operationsThat(const Withdrawable& areMeant);
   void withdraw(const Withdrawable& isMeant);
+  void revokeOperations(const Withdrawable& areMeant);
   std::string receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken);
   std::shared_ptr<const AccountCredential> tokenOf(const AccountRecord& account);
 

@@ -172,9 +172,9 @@ void AccountOperations::revoke(const BusCaller& caller, const std::string& accou
   } else {
     client = registeredClient(clientID);
   }
-  withdraw([&](const Running& running) { return running.client == clientID; });
   BusLoop::handOver();
-  const auto turn = _lanes.enter(clientID, ClientLanes::Bound::waived, [] {});
+  const auto hold = _lanes.hold(clientID);
+  revokeOperations([&](const Running& running) { return running.client == clientID; });
   refuseUnlessStored(
       _parts.store.noteIntent({.kind = Intent::Kind::revocation, .accountTypeIdentifier = accountType, .clientID = clientID}));
   manage(accountType, [&](auto& plugin, const auto& type, const auto& store, auto completion) {
@@ -186,13 +186,29 @@ void AccountOperations::revoke(const BusCaller& caller, const std::string& accou
 
 void AccountOperations::revokeAll(const BusCaller& caller, const std::string& accountType) {
   refuseUnlessManager(caller);
-  withdraw([](const Running&) { return true; });
   BusLoop::handOver();
-  const auto turn = _lanes.enterAll([] {});
+  const auto hold = _lanes.holdAll();
+  revokeOperations([](const Running&) { return true; });
   refuseUnlessStored(_parts.store.noteRemovalOfAllClients(AccountType(accountType)));
   manage(accountType, [&](auto& plugin, const auto& type, const auto& store, auto completion) {
     plugin.revokeAllAccessToAccountsOfType(type, store, std::move(completion));
   });
+}
+
+// The server may issue a token to what is cancelled here, so that token is taken back like one that was stored. All of this
+// comes before the revocation is noted, in whose place the note of a grant stands until then.
+void AccountOperations::revokeOperations(const Withdrawable& areMeant) {
+  const auto operations = operationsThat(areMeant);
+  for (const auto& operation : operations) operation->revoke();
+  // A refusal that nobody gave stands until its operation ends. It must not become one that the revocation finds.
+  if (!operations.empty()) refuseUnlessStored(_parts.store.removeAllAnswersByNobody());
+  for (const auto& operation : operations) {
+    const auto appID = operation->appOfAskedToken();
+    const auto accounts = storeCall([&] { return _parts.store.accounts(); });
+    const auto account =
+        std::ranges::find(accounts, operation->grant()->accountTypeIdentifier, &AccountRecord::accountTypeIdentifier);
+    if (appID && account != accounts.end()) storeCall([&] { _parts.outbox.add(account->id, *appID); });
+  }
 }
 
 // A revocation says that it was handled, or why it was not.

@@ -2,68 +2,63 @@
 
 namespace palisade {
 
-ClientLanes::Turn ClientLanes::enter(const std::string& client, Bound bound, const std::function<void()>& beforeWaiting) {
+ClientLanes::Place ClientLanes::enter(const std::string& client, const std::function<void()>& beforeWaiting) {
   std::unique_lock lock(_mutex);
   Lane& lane = _lanes[client];
-  if (bound == Bound::kept && lane.size() >= _longest) {
+  if (lane.size() >= _longest) {
     throw LaneIsFull("This application has " + std::to_string(_longest) +
                      " unanswered requests already. Wait for an answer, or close one.");
   }
   const std::uint64_t ticket = _nextTicket++;
   lane.push_back(ticket);
-  try {
-    waitUntil(lock, beforeWaiting, [&] { return lane.front() == ticket && !_isTakenByOne; });
-  } catch (...) {
-    giveUp(client, ticket);
-    throw;
+  const auto isItsTurn = [&] { return lane.front() == ticket && !isHeld(client); };
+  if (!isItsTurn()) {
+    lock.unlock();
+    try {
+      beforeWaiting();
+    } catch (...) {
+      leave(client, ticket);
+      throw;
+    }
+    lock.lock();
+    _hasMoved.wait(lock, isItsTurn);
   }
-  ++_active;
-  return {*this, client};
+  return Place([this, client, ticket] { leave(client, ticket); });
 }
 
-ClientLanes::Turn ClientLanes::enterAll(const std::function<void()>& beforeWaiting) {
+ClientLanes::Place ClientLanes::hold(const std::string& client) {
   std::unique_lock lock(_mutex);
-  waitUntil(lock, beforeWaiting, [&] { return !_isTakenByOne; });
-  _isTakenByOne = true;
-  try {
-    waitUntil(lock, beforeWaiting, [&] { return _active == 0; });
-  } catch (...) {
-    leave(std::nullopt);
-    throw;
-  }
-  return {*this, std::nullopt};
+  _hasMoved.wait(lock, [&] { return !isHeld(client); });
+  _held.insert(client);
+  return Place([this, client] {
+    {
+      const std::lock_guard guard(_mutex);
+      _held.erase(client);
+    }
+    _hasMoved.notify_all();
+  });
 }
 
-void ClientLanes::waitUntil(std::unique_lock<std::mutex>& lock, const std::function<void()>& beforeWaiting,
-                            const std::function<bool()>& isTrue) {
-  if (isTrue()) return;
-  lock.unlock();
-  beforeWaiting();
-  lock.lock();
-  _hasMoved.wait(lock, isTrue);
+ClientLanes::Place ClientLanes::holdAll() {
+  std::unique_lock lock(_mutex);
+  _hasMoved.wait(lock, [&] { return !_allAreHeld; });
+  _allAreHeld = true;
+  _hasMoved.wait(lock, [&] { return _held.empty(); });
+  return Place([this] {
+    {
+      const std::lock_guard guard(_mutex);
+      _allAreHeld = false;
+    }
+    _hasMoved.notify_all();
+  });
 }
 
-void ClientLanes::giveUp(const std::string& client, std::uint64_t ticket) {
+void ClientLanes::leave(const std::string& client, std::uint64_t ticket) {
   {
     const std::lock_guard lock(_mutex);
     const auto lane = _lanes.find(client);
     std::erase(lane->second, ticket);
     if (lane->second.empty()) _lanes.erase(lane);
-  }
-  _hasMoved.notify_all();
-}
-
-void ClientLanes::leave(const std::optional<std::string>& client) {
-  {
-    const std::lock_guard lock(_mutex);
-    if (client) {
-      --_active;
-      const auto lane = _lanes.find(*client);
-      lane->second.pop_front();
-      if (lane->second.empty()) _lanes.erase(lane);
-    } else {
-      _isTakenByOne = false;
-    }
   }
   _hasMoved.notify_all();
 }

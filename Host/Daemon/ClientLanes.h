@@ -1,10 +1,10 @@
 #pragma once
 
-/// Keeps the operations of one client in order, one at a time, and their number bounded.
+/// Keeps the operations of one client in order, one at a time, and their number bounded; lets a revocation overtake them.
 ///
-/// Threads: both `enter`s block the calling thread until its turn has come; `beforeWaiting` is called if there is something to
-/// wait for. Ownership: a turn ends when its object goes away. Errors: `LaneIsFull` when a client has too many operations;
-/// whoever throws in `beforeWaiting` gives its turn up.
+/// Threads: `enter` and both `hold`s block the calling thread until it may go on; `beforeWaiting` is called if there is
+/// something to wait for. Ownership: a turn or a hold ends when its object goes away. Errors: `LaneIsFull` when a client has
+/// too many operations; whoever throws in `beforeWaiting` gives its place up.
 
 #include <condition_variable>
 #include <cstddef>
@@ -13,7 +13,7 @@
 #include <functional>
 #include <map>
 #include <mutex>
-#include <optional>
+#include <set>
 #include <stdexcept>
 #include <string>
 #include <utility>
@@ -29,54 +29,47 @@ class ClientLanes {
  public:
   explicit ClientLanes(std::size_t longest) : _longest(longest) {}
 
-  class Turn {
+  /// What an operation or a revocation has of the lanes, until it ends.
+  class Place {
    public:
-    /// Of one client, or of all of them.
-    Turn(ClientLanes& lanes, std::optional<std::string> client) : _lanes(lanes), _client(std::move(client)) {}
-    Turn(const Turn&) = delete;
-    Turn& operator=(const Turn&) = delete;
-    ~Turn() { end(); }
+    explicit Place(std::function<void()> leave) : _leave(std::move(leave)) {}
+    Place(const Place&) = delete;
+    Place& operator=(const Place&) = delete;
+    ~Place() { end(); }
 
     /// Ends it before the object does. From any thread, but not from two at once.
     void end() {
-      if (!std::exchange(_isOver, true)) _lanes.leave(_client);
+      if (const auto leave = std::exchange(_leave, nullptr)) leave();
     }
 
    private:
-    ClientLanes& _lanes;
-    std::optional<std::string> _client;
-    bool _isOver = false;
-  };
-
-  enum class Bound {
-    kept,    ///< refused when the client's lane is full
-    waived,  ///< never refused: a revocation, say
+    std::function<void()> _leave;
   };
 
   /// The client's turn.
-  [[nodiscard]] Turn enter(const std::string& client, Bound bound, const std::function<void()>& beforeWaiting);
+  [[nodiscard]] Place enter(const std::string& client, const std::function<void()>& beforeWaiting);
 
-  /// Everybody's turn: no operation of any client runs beside it.
-  [[nodiscard]] Turn enterAll(const std::function<void()>& beforeWaiting);
+  /// Lets none of the client's operations begin. The one whose turn it is goes on, and is not waited for; another hold is.
+  [[nodiscard]] Place hold(const std::string& client);
+
+  /// The same for every client.
+  [[nodiscard]] Place holdAll();
 
  private:
   /// The tickets of one client's operations; the first one's turn it is.
   using Lane = std::deque<std::uint64_t>;
 
-  void giveUp(const std::string& client, std::uint64_t ticket);
-  void leave(const std::optional<std::string>& client);
-  void waitUntil(std::unique_lock<std::mutex>& lock, const std::function<void()>& beforeWaiting,
-                 const std::function<bool()>& isTrue);
+  bool isHeld(const std::string& client) const { return _allAreHeld || _held.contains(client); }
+  void leave(const std::string& client, std::uint64_t ticket);
 
   const std::size_t _longest;
   std::mutex _mutex;
   std::condition_variable _hasMoved;
   std::map<std::string, Lane> _lanes;
   std::uint64_t _nextTicket = 0;
-  /// Operations whose turn it is.
-  std::size_t _active = 0;
-  /// Somebody has, or waits for, everybody's turn: nobody else's begins.
-  bool _isTakenByOne = false;
+  std::set<std::string> _held;
+  /// Somebody holds all clients, or waits for it: nobody else's hold begins, and no operation.
+  bool _allAreHeld = false;
 };
 
 }  // namespace palisade

@@ -3,8 +3,9 @@
 /// One operation that a client asked for, while it is carried out.
 ///
 /// Purpose: services that the plug-in calls learn from it for whom they work, tell it that they are about to wait, and hear
-/// from it that the operation was withdrawn. Threads: made and ended by the thread that carries the operation, whose current
-/// operation it then is; `withdraw` comes from any thread. Ownership: shared with whoever may withdraw it. Errors: none.
+/// from it that the operation was withdrawn, or that the access it is about was taken back. Threads: made and ended by the
+/// thread that carries the operation, whose current operation it then is; `withdraw` and `revoke` come from any thread.
+/// Ownership: shared with whoever may withdraw it, and with each wait that may be interrupted. Errors: none.
 
 #include <atomic>
 #include <functional>
@@ -12,13 +13,14 @@
 #include <mutex>
 #include <optional>
 #include <set>
+#include <string>
 
 #include "Host/Accounts/Intent.h"
 #include "Host/Bus/AccountsService.h"
 
 namespace palisade {
 
-class Operation {
+class Operation : public std::enable_shared_from_this<Operation> {
  public:
   /// `beforeFirstWait` is called once, on the operation's thread, before it waits for a user or a server.
   /// `grant` is what the operation may come to.
@@ -39,12 +41,34 @@ class Operation {
   /// The operation may wait for long from here on.
   void aboutToWait();
 
-  /// Ends what the operation waits for, now or later; from then on nobody will answer it.
+  /// Ends what the operation waits for, now or later; from then on nobody will answer it. Does not wait.
   void withdraw();
   bool isWithdrawn() const { return _isWithdrawn.load(std::memory_order_acquire); }
 
+  /// Withdraws the operation, and also ends its waits for what the user has allowed already. It fails with a sentence that says
+  /// so, and stores nothing from here on: returns when a write that was under way has ended.
+  void revoke();
+  bool isRevoked() const { return _isRevoked.load(std::memory_order_acquire); }
+
+  /// Carries out a write unless the operation was revoked, which waits for the end of the write; answers its error, or that.
+  std::optional<Error> unlessRevoked(const std::function<std::optional<Error>()>& write);
+
+  enum class Interruption {
+    withdrawal,  ///< of whatever kind
+    revocation   ///< a mere withdrawal lets the wait go on
+  };
+
   /// Calls `interrupt` when the operation is withdrawn while the result lives, or at once if it has been.
-  [[nodiscard]] std::shared_ptr<const void> interruptWith(std::function<void()> interrupt);
+  [[nodiscard]] std::shared_ptr<const void> interruptWith(std::function<void()> interrupt,
+                                                          Interruption kind = Interruption::withdrawal);
+
+  /// The server is about to be asked for a token for the app. The first call counts.
+  void tokenIsAskedFor(const std::string& appID);
+  std::optional<std::string> appOfAskedToken() const;
+
+  /// The server is about to be asked for something that the user has to be asked about afterwards.
+  void serverIsAsked() { _serverAsked.store(true, std::memory_order_release); }
+  bool wasServerAsked() const { return _serverAsked.load(std::memory_order_acquire); }
 
   /// An alert of the operation stands before the user.
   void userIsAsked() { _userAsked.store(true, std::memory_order_release); }
@@ -66,15 +90,26 @@ class Operation {
  private:
   friend class OperationScope;
 
+  struct Interrupt {
+    std::function<void()> call;
+    Interruption kind;
+  };
+
+  void interrupt(Interruption reason);
+
   std::function<void()> _beforeFirstWait;
   const std::optional<Intent> _grant;
   std::atomic<bool> _isWithdrawn = false;
+  std::atomic<bool> _isRevoked = false;
+  std::atomic<bool> _serverAsked = false;
   std::atomic<bool> _userAsked = false;
   std::atomic<bool> _userAnswered = false;
   std::atomic<bool> _wentUnanswered = false;
   mutable std::mutex _mutex;
-  std::set<std::shared_ptr<const std::function<void()>>> _interrupts;
+  std::set<std::shared_ptr<const Interrupt>> _interrupts;
   std::optional<BusFailure> _failure;
+  std::optional<std::string> _appOfAskedToken;
+  std::mutex _writing;
   mutable std::mutex _notingMutex;
   bool _hasNotedGrant = false;
   std::optional<Error> _noteError;

@@ -34,7 +34,14 @@ std::optional<Error> OperationKeychain::setCredentialForAccount(const std::share
     auto unnoted = operation->noteGrant([this](const Intent& grant) { return _store.noteIntent(grant); });
     if (unnoted) return answered(std::move(unnoted), BusFailureKind::storeUnavailable, operation.get());
   }
-  return answered(_keychain.setCredentialForAccount(account, clientID), BusFailureKind::keychainUnavailable, operation.get());
+  auto error = _keychain.setCredentialForAccount(account, clientID);
+  // A revocation does not wait for a keychain that takes its time, so it may have found no token yet. No other operation of the
+  // client begins before this one has ended: the token is the one that was stored just now.
+  if (!error && operation != nullptr && operation->isRevoked()) {
+    error = _keychain.removeCredentialForAccount(account, clientID);
+    if (!error) error = operation->unlessRevoked([] { return std::nullopt; });
+  }
+  return answered(std::move(error), BusFailureKind::keychainUnavailable, operation.get());
 }
 
 std::optional<Error> OperationKeychain::removeCredentialForAccount(const std::shared_ptr<Account>& account,

@@ -3,7 +3,8 @@
 /// The keychain as the plug-ins see it: it knows for whose operation it works.
 ///
 /// Before a client's token is stored, the grant that it is for is noted in the account store, so that a crash between the two
-/// leaves no token that nobody answers for. A keychain that refuses fails the operation: no grant stands without its token.
+/// leaves no token that nobody answers for. A keychain that refuses fails the operation: no grant stands without its token. The
+/// token of an operation whose access was taken back does not stay.
 /// Threads: as `KeychainManager` says. Ownership: borrows the keychain and the store. Errors: the keychain's and the store's.
 
 #include <functional>

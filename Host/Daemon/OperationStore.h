@@ -4,7 +4,8 @@
 ///
 /// A refusal that the user did not give (the alert was withdrawn, nobody could be asked) is stored with that mark, so that it
 /// can be removed when the operation has ended: the plug-in asks for the record and gets it, but it does not stay. A record
-/// that could not be stored fails the operation, whatever the plug-in makes of it. Threads: used by the operation's thread and
+/// that could not be stored fails the operation, whatever the plug-in makes of it. Once the access that the operation is about
+/// was taken back, nothing of it is stored. Threads: used by the operation's thread and
 /// by the threads that bring its server's answers. Ownership: shared by the plug-in's callbacks; keeps the operation, borrows
 /// the store. Errors: the store's.
 
@@ -44,9 +45,11 @@ class OperationStore final : public AccountStore, public AuthorizationManager {
                    .code = StoreErrorConstraint,
                    .description = "A grant whose token could not be stored is not recorded."};
     }
-    return answered(authorization.isGranted() || _operation->isAnsweredByUser()
-                        ? _store.setAuthorization(authorization, forClient, onAccountType)
-                        : _store.setAuthorizationAnsweredByNobody(authorization, forClient, onAccountType));
+    return answered(_operation->unlessRevoked([&] {
+      return authorization.isGranted() || _operation->isAnsweredByUser()
+                 ? _store.setAuthorization(authorization, forClient, onAccountType)
+                 : _store.setAuthorizationAnsweredByNobody(authorization, forClient, onAccountType);
+    }));
   }
 
   std::optional<Error> removeAllClientAuthorizationsForAccountType(const AccountType& accountType) override {

@@ -21,8 +21,7 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::ThrowsMessage;
 using testing::UnorderedElementsAre;
-using Bound = ClientLanes::Bound;
-using HeldTurn = std::unique_ptr<ClientLanes::Turn>;
+using Place = std::unique_ptr<ClientLanes::Place>;
 
 // Who had a turn, in order.
 class Turns {
@@ -41,13 +40,13 @@ class Turns {
   std::vector<std::string> _names;
 };
 
-// A thread that asks for a turn, notes it and leaves.
+// A thread that asks for a place, notes it and leaves.
 class Caller {
  public:
   template <typename Enter>
   Caller(const std::string& name, Turns& turns, Enter enter)
       : _thread([this, name, &turns, enter] {
-          const auto turn = enter([this] {
+          const auto place = enter([this] {
             ++_waits;
             _waits.notify_all();
           });
@@ -64,23 +63,15 @@ class Caller {
 
 class Lanes : public testing::Test {
  protected:
-  HeldTurn hold(const std::string& client, Bound bound = Bound::kept) {
-    return HeldTurn(
-        new ClientLanes::Turn(lanes.enter(client, bound, [] { ADD_FAILURE() << "There is nothing to wait for."; })));
+  Place turn(const std::string& client) {
+    return Place(new ClientLanes::Place(lanes.enter(client, [] { ADD_FAILURE() << "There is nothing to wait for."; })));
   }
-  HeldTurn holdAll() {
-    return HeldTurn(new ClientLanes::Turn(lanes.enterAll([] { ADD_FAILURE() << "There is nothing to wait for."; })));
-  }
-  // Both return when the caller waits.
-  std::unique_ptr<Caller> queueUp(const std::string& name, const std::string& client, Bound bound = Bound::kept) {
+  Place hold(const std::string& client) { return Place(new ClientLanes::Place(lanes.hold(client))); }
+  Place holdAll() { return Place(new ClientLanes::Place(lanes.holdAll())); }
+  // Returns when the caller waits.
+  std::unique_ptr<Caller> queueUp(const std::string& name, const std::string& client) {
     auto caller = std::make_unique<Caller>(
-        name, turns, [this, client, bound](const auto& beforeWaiting) { return lanes.enter(client, bound, beforeWaiting); });
-    caller->waitUntilItWaits();
-    return caller;
-  }
-  std::unique_ptr<Caller> queueUpForAll(const std::string& name) {
-    auto caller =
-        std::make_unique<Caller>(name, turns, [this](const auto& beforeWaiting) { return lanes.enterAll(beforeWaiting); });
+        name, turns, [this, client](const auto& beforeWaiting) { return lanes.enter(client, beforeWaiting); });
     caller->waitUntilItWaits();
     return caller;
   }
@@ -90,27 +81,28 @@ class Lanes : public testing::Test {
 };
 
 TEST_F(Lanes, AreFreeAsSoonAsATurnIsEnded) {
-  const HeldTurn ended = hold("photos");
+  const Place ended = turn("photos");
   ended->end();
-  EXPECT_NE(hold("photos"), nullptr) << "and it does not end twice";
+  EXPECT_NE(turn("photos"), nullptr) << "and it does not end twice";
   ended->end();
-  EXPECT_NE(hold("photos"), nullptr);
+  EXPECT_NE(turn("photos"), nullptr);
 }
 
 TEST_F(Lanes, GiveATurnAtOnceWhereNobodyIsInTheWay) {
-  hold("editor");
-  hold("editor");
+  turn("editor");
+  turn("editor");
   holdAll();
   hold("editor");
+  turn("editor");
 }
 
 TEST_F(Lanes, LetOtherClientsRunBesideAClient) {
-  const HeldTurn editor = hold("editor");
-  const HeldTurn viewer = hold("viewer");
+  const Place editor = turn("editor");
+  const Place viewer = turn("viewer");
 }
 
 TEST_F(Lanes, KeepAClientsOperationsInOrder) {
-  HeldTurn first = hold("editor");
+  Place first = turn("editor");
   const auto second = queueUp("second", "editor");
   const auto third = queueUp("third", "editor");
   EXPECT_THAT(turns.names(), IsEmpty());
@@ -124,10 +116,10 @@ TEST_F(Lanes, RunAClientsOperationsOneAtATime) {
   std::atomic<int> running = 0;
   std::atomic<int> most = 0;
   std::vector<std::jthread> threads;
-  for (int thread = 0; thread < 4; ++thread) {
+  for (int thread = 0; thread < 3; ++thread) {
     threads.emplace_back([&] {
       for (int operation = 0; operation < 100; ++operation) {
-        const auto turn = lanes.enter("editor", Bound::waived, [] {});
+        const auto turn = lanes.enter("editor", [] {});
         most = std::max(most.load(), ++running);
         --running;
       }
@@ -138,79 +130,84 @@ TEST_F(Lanes, RunAClientsOperationsOneAtATime) {
 }
 
 TEST_F(Lanes, RefuseAClientWithTooManyOperations) {
-  HeldTurn first = hold("editor");
+  Place first = turn("editor");
   const auto second = queueUp("second", "editor");
   const auto third = queueUp("third", "editor");
-  EXPECT_THAT([&] { static_cast<void>(lanes.enter("editor", Bound::kept, [] {})); },
+  EXPECT_THAT([&] { static_cast<void>(lanes.enter("editor", [] {})); },
               ThrowsMessage<LaneIsFull>(HasSubstr("3 unanswered requests")));
-  hold("viewer");
+  turn("viewer");
 
   first.reset();
   second->waitUntilItHasLeft();
   third->waitUntilItHasLeft();
-  hold("editor");
+  turn("editor");
 }
 
-TEST_F(Lanes, NeverRefuseWhereTheBoundIsWaived) {
-  HeldTurn first = hold("editor");
+TEST_F(Lanes, AreHeldAtOnceWhateverRunsOrWaitsInThem) {
+  Place first = turn("editor");
   const auto second = queueUp("second", "editor");
-  const auto third = queueUp("third", "editor");
-  const auto revocation = queueUp("revocation", "editor", Bound::waived);
-  EXPECT_THROW(static_cast<void>(lanes.enter("editor", Bound::kept, [] {})), LaneIsFull);
+  Place held = hold("editor");
+  held.reset();
+  held = holdAll();
+  held.reset();
   first.reset();
-  revocation->waitUntilItHasLeft();
-  EXPECT_THAT(turns.names(), ElementsAre("second", "third", "revocation"));
+  second->waitUntilItHasLeft();
 }
 
-TEST_F(Lanes, GiveEverybodysTurnWhenAllTurnsHaveEnded) {
-  HeldTurn editor = hold("editor");
-  HeldTurn viewer = hold("viewer");
-  const auto all = queueUpForAll("all");
-  editor.reset();
+TEST_F(Lanes, LetNoOperationBeginWhileTheyAreHeld) {
+  Place first = turn("editor");
+  const auto second = queueUp("second", "editor");
+  Place held = hold("editor");
+  first.reset();
+  const auto third = queueUp("third", "editor");
+  turn("viewer");
   EXPECT_THAT(turns.names(), IsEmpty());
-  viewer.reset();
-  all->waitUntilItHasLeft();
-  EXPECT_THAT(turns.names(), ElementsAre("all"));
+  held.reset();
+  second->waitUntilItHasLeft();
+  third->waitUntilItHasLeft();
+  EXPECT_THAT(turns.names(), ElementsAre("second", "third"));
 }
 
-TEST_F(Lanes, BeginNoTurnBesideEverybodys) {
-  HeldTurn all = holdAll();
+TEST_F(Lanes, LetNobodysOperationBeginWhileAllAreHeld) {
+  Place held = holdAll();
   const auto editor = queueUp("editor", "editor");
-  const auto viewer = queueUp("viewer", "viewer", Bound::waived);
-  const auto another = queueUpForAll("another");
+  const auto viewer = queueUp("viewer", "viewer");
   EXPECT_THAT(turns.names(), IsEmpty());
-  all.reset();
+  held.reset();
   editor->waitUntilItHasLeft();
   viewer->waitUntilItHasLeft();
-  another->waitUntilItHasLeft();
-  EXPECT_THAT(turns.names(), UnorderedElementsAre("editor", "viewer", "another"));
+  EXPECT_THAT(turns.names(), UnorderedElementsAre("editor", "viewer"));
 }
 
-TEST_F(Lanes, BeginNoTurnWhileSomebodyWaitsForEverybodys) {
-  HeldTurn editor = hold("editor");
-  const auto all = queueUpForAll("all");
-  const auto viewer = queueUp("viewer", "viewer");
-  const auto next = queueUp("next", "editor");
-  editor.reset();
-  viewer->waitUntilItHasLeft();
-  next->waitUntilItHasLeft();
-  EXPECT_EQ(turns.names().front(), "all");
+TEST_F(Lanes, AreHeldByOneAtATime) {
+  std::atomic<int> holders = 0;
+  std::atomic<int> most = 0;
+  std::vector<std::jthread> threads;
+  for (int thread = 0; thread < 4; ++thread) {
+    threads.emplace_back([&, holdsAll = thread % 2 == 0] {
+      for (int round = 0; round < 100; ++round) {
+        const auto held = holdsAll ? lanes.holdAll() : lanes.hold("editor");
+        most = std::max(most.load(), ++holders);
+        --holders;
+      }
+    });
+  }
+  threads.clear();
+  EXPECT_EQ(most, 1);
 }
 
 TEST_F(Lanes, GoOnWithoutAnOperationThatCannotAnnounceItsWait) {
   const std::function<void()> fail = [] { throw std::runtime_error("The caller is gone."); };
-  HeldTurn first = hold("editor");
+  Place first = turn("editor");
   const auto second = queueUp("second", "editor");
-  EXPECT_THROW(static_cast<void>(lanes.enter("editor", Bound::kept, fail)), std::runtime_error);
+  EXPECT_THROW(static_cast<void>(lanes.enter("editor", fail)), std::runtime_error);
   const auto third = queueUp("third", "editor");
-  EXPECT_THROW(static_cast<void>(lanes.enterAll(fail)), std::runtime_error);
-  hold("viewer");
+  turn("viewer");
 
   first.reset();
   second->waitUntilItHasLeft();
   third->waitUntilItHasLeft();
   EXPECT_THAT(turns.names(), ElementsAre("second", "third"));
-  holdAll();
 }
 
 }  // namespace

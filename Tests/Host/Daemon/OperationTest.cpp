@@ -90,6 +90,80 @@ TEST(AnOperation, IsWithdrawnFromAnotherThreadWhateverItDoesJustThen) {
   }
 }
 
+TEST(AnOperation, ThatIsRevokedIsWithdrawnAndHasFailed) {
+  MockFunction<void()> interrupt;
+  Operation operation(nullptr);
+  const auto registration = operation.interruptWith(interrupt.AsStdFunction());
+  EXPECT_CALL(interrupt, Call).Times(1);
+  operation.revoke();
+  EXPECT_TRUE(operation.isWithdrawn());
+  EXPECT_TRUE(operation.isLeftUnanswered());
+  ASSERT_TRUE(operation.failure());
+  EXPECT_EQ(operation.failure()->kind(), BusFailureKind::accessRevoked);
+}
+
+TEST(AnOperation, GoesOnWithWhatItsUserHasAllowedUntilItIsRevoked) {
+  MockFunction<void()> interrupt;
+  Operation operation(nullptr);
+  const auto registration = operation.interruptWith(interrupt.AsStdFunction(), Operation::Interruption::revocation);
+  EXPECT_CALL(interrupt, Call).Times(0);
+  operation.withdraw();
+  testing::Mock::VerifyAndClearExpectations(&interrupt);
+  EXPECT_CALL(interrupt, Call).Times(2);
+  operation.revoke();
+  const auto afterwards = operation.interruptWith(interrupt.AsStdFunction(), Operation::Interruption::revocation);
+}
+
+TEST(AnOperation, WritesNothingOnceItIsRevoked) {
+  const auto write = [] { return std::optional(Error{.domain = "disk", .code = 1}); };
+  Operation operation(nullptr);
+  EXPECT_EQ(operation.unlessRevoked(write)->domain, "disk");
+  operation.revoke();
+  EXPECT_EQ(operation
+                .unlessRevoked([]() -> std::optional<Error> {
+                  ADD_FAILURE() << "Nothing may be written.";
+                  return std::nullopt;
+                })
+                ->description,
+            operation.failure()->what());
+}
+
+TEST(AnOperation, IsRevokedWhenTheWriteThatIsUnderWayHasEnded) {
+  for (int attempt = 0; attempt < 100; ++attempt) {
+    Operation operation(nullptr);
+    bool isStored = false;
+    std::jthread other;
+    const auto error = operation.unlessRevoked([&]() -> std::optional<Error> {
+      other = std::jthread([&] {
+        operation.revoke();
+        EXPECT_TRUE(isStored);
+      });
+      while (!operation.isRevoked()) std::this_thread::yield();
+      isStored = true;
+      return std::nullopt;
+    });
+    EXPECT_FALSE(error);
+  }
+}
+
+TEST(AnOperation, MayBeOutlivedByItsWaits) {
+  MockFunction<void()> interrupt;
+  EXPECT_CALL(interrupt, Call).Times(0);
+  auto operation = std::make_shared<Operation>(nullptr);
+  auto registration = operation->interruptWith(interrupt.AsStdFunction());
+  const std::weak_ptr<Operation> ended = operation;
+  operation.reset();
+  registration.reset();
+  EXPECT_TRUE(ended.expired());
+}
+
+TEST(AnOperation, RemembersForWhichAppATokenIsAsked) {
+  Operation operation(nullptr);
+  EXPECT_FALSE(operation.appOfAskedToken());
+  operation.tokenIsAskedFor("1");
+  EXPECT_EQ(operation.appOfAskedToken(), "1");
+}
+
 TEST(AnOperation, IsLeftUnansweredWhenItIsWithdrawnOrItsAlertIs) {
   Operation operation(nullptr);
   EXPECT_FALSE(operation.isLeftUnanswered());
