@@ -37,6 +37,14 @@ def wait_until(is_true, what: str):
     return result
 
 
+def command_of(process: int) -> "str | None":
+    """What a process was started as; the daemons show nobody which file they run. None when it has ended."""
+    try:
+        return pathlib.Path(f"/proc/{process}/cmdline").read_text(encoding="utf-8").split("\0")[0] or None
+    except (FileNotFoundError, ProcessLookupError):
+        return None
+
+
 class Session:
     """A bus that knows the installed services and nothing else, and a home that nobody has used yet."""
 
@@ -74,7 +82,7 @@ class Session:
         self._bus.stdout.close()
         self._log.close()
         for daemon in filter(None, daemons):
-            wait_until(lambda: not pathlib.Path(f"/proc/{daemon}/exe").exists(), "the daemons have ended with their bus")
+            wait_until(lambda: command_of(daemon) is None, "the daemons have ended with their bus")
         self._folder.cleanup()
 
     def run(self, *command: str, text: str = "") -> subprocess.CompletedProcess:
@@ -118,7 +126,7 @@ class Session:
 
     def program_of(self, name: str) -> "str | None":
         process = self.process_of(name)
-        return os.readlink(f"/proc/{process}/exe") if process else None
+        return command_of(process) if process else None
 
 
 class TheInstalledDaemons(unittest.TestCase):

@@ -141,9 +141,15 @@ INSTANTIATE_TEST_SUITE_P(
                     Mistake{"unknownCommand", {"frob"}, "\"frob\""}, Mistake{"aWordTooMany", {"tokens", "all"}, "all"},
                     Mistake{"noFault", {"fault"}, "Name one fault"}, Mistake{"badPort", {"--port", "high"}, "\"high\""},
                     Mistake{"badCertificate", {"--certificate", "nice"}, "\"nice\""},
-                    Mistake{"missingPermissions", {"--permissions", "/nowhere/list", "--directory", "/tmp"}, "/nowhere/list"},
                     Mistake{"nothingRunning", {"tokens", "--directory", "/nowhere"}, "palisade-sandbox --directory /nowhere"}),
     [](const auto& test) { return test.param.name; });
+
+TEST(AListOfPermissionsThatIsMissing, IsAnErrorThatNamesIt) {
+  TemporaryFolder folder;
+  const Output output = run({"--permissions", "/nowhere/list", "--directory", folder.path().string()});
+  EXPECT_EQ(output.status, 2);
+  EXPECT_THAT(output.text, HasSubstr("/nowhere/list"));
+}
 
 TEST(AFaultThatDoesNotExist, IsRefused) {
   Sandbox sandbox;
