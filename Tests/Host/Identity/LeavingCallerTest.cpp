@@ -7,6 +7,8 @@
 
 #include "Tests/Host/Identity/Identify.h"
 #include "Tests/Host/Identity/Records.h"
+#include "Tests/Host/OwnRoot.h"
+#include "Tests/Host/TemporaryFolder.h"
 
 namespace palisade {
 namespace {
@@ -104,15 +106,16 @@ TEST(AProcessThatGotTheNumberOfACaller, IsRefused) {
 }
 
 TEST(AProcessOfAnotherUser, IsRefused) {
-  if (geteuid() != 0) GTEST_SKIP() << "Only root can become another user; run this test as root.";
-  const std::string asNobody = "setpriv --reuid=65534 --regid=65534 --clear-groups ";
-  if (outputOf(asNobody + "test -x " TRIAL_PROGRAM " && echo reachable") != "reachable\n") {
-    GTEST_SKIP() << "Other users cannot reach " TRIAL_PROGRAM ".";
-  }
+  if (ranWithItsOwnRoot()) return;
+  const TemporaryFolder folder;
+  // The other user may not reach the folder in which this was built.
+  const auto trial = folder.path() / "trial";
+  std::filesystem::copy_file(TRIAL_PROGRAM, trial);
+  std::filesystem::permissions(folder.path(), std::filesystem::perms(0755));
   const CallerProcess caller({CALLER_PROGRAM});
-  EXPECT_THAT(
-      outputOf("setpriv --reuid=65534 --regid=65534 --clear-groups " TRIAL_PROGRAM " identify " + std::to_string(caller.pid())),
-      AllOf(StartsWith("refused: "), HasSubstr("cannot be read: Permission denied")));
+  EXPECT_THAT(outputOf("setpriv --reuid=65534 --regid=65534 --clear-groups " + trial.string() + " identify " +
+                       std::to_string(caller.pid())),
+              AllOf(StartsWith("refused: "), HasSubstr("cannot be read: Permission denied")));
 }
 
 }  // namespace
