@@ -6,13 +6,17 @@
 /// Every basic D-Bus type has a place: the smaller integers become integers, object paths and signatures strings. Arrays and
 /// dictionaries with string keys are converted with all that they hold, nested as deep as D-Bus allows; a variant is what it
 /// holds. Text that the bus's library does not send (ValidText.h) is repaired, so that one bad name spoils no listing.
-/// Threads: pure functions. Errors: `UnsuitableType` for a type that has no place, such as a file descriptor.
+///
+/// A dictionary holds at most `largestBusDictionary`: the bytes of its texts and keys, and eight more for each key and value.
+/// When that is exceeded, the rest of what is received is not looked at. Threads: pure functions. Errors: `UnsuitableType` for
+/// a type that has no place, such as a file descriptor; `TooLarge`.
 
 #include <sdbus-c++/Error.h>
 #include <sdbus-c++/Message.h>
 #include <sdbus-c++/TypeTraits.h>
 #include <sdbus-c++/Types.h>
 
+#include <cstddef>
 #include <map>
 #include <string>
 
@@ -24,6 +28,14 @@ namespace palisade {
 class UnsuitableType : public sdbus::Error {
  public:
   explicit UnsuitableType(const std::string& message) : Error("com.veltran.Accounts1.Error.InvalidArguments", message) {}
+};
+
+inline constexpr std::size_t largestBusDictionary = 64 * 1024;
+
+/// A dictionary holds more than that.
+class TooLarge : public sdbus::Error {
+ public:
+  TooLarge() : Error("com.veltran.Accounts1.Error.InvalidArguments", "A dictionary holds more than 64 KiB.") {}
 };
 
 using BusDictionary = std::map<std::string, sdbus::Variant>;

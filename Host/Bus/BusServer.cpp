@@ -12,6 +12,7 @@
 #include "DBus/Accounts1Adaptor.h"
 #include "Host/Bus/BusLoop.h"
 #include "Host/Bus/BusNotifications.h"
+#include "Host/Bus/RequestBounds.h"
 #include "Host/Bus/RequestObjects.h"
 #include "Host/Bus/TokenPipe.h"
 #include "Host/Text/ValidText.h"
@@ -27,14 +28,14 @@ using BusRows = std::vector<BusDictionary>;
 BusRows rowsToBus(const Rows& rows) {
   BusRows converted;
   converted.reserve(rows.size());
-  for (const Dictionary& row : rows) converted.push_back(dictionaryToBus(row));
+  for (const Dictionary& row : rows) converted.push_back(dictionaryToBus(shortenedRow(row)));
   return converted;
 }
 
 void refuseUnknownOptions(const Dictionary& options, std::initializer_list<std::string_view> known) {
   for (const auto& [key, value] : options) {
     if (std::find(known.begin(), known.end(), key) == known.end()) {
-      throw BusFailure(BusFailureKind::invalidArguments, "There is no option '" + key + "'.");
+      throw BusFailure(BusFailureKind::invalidArguments, "There is no option '" + shortened(key, 64) + "'.");
     }
   }
 }
@@ -137,6 +138,10 @@ class BusServer::Implementation final : private OwnedConnection,
 
  private:
   void RequestAccess(AccessResult&& result, std::string accountType, Dictionary accessOptions, Dictionary options) override {
+    checked([&] {
+      requireName("account_type", accountType);
+      requireBoundedAccessOptions(accessOptions);
+    });
     startRequest(std::move(result), options,
                  [this, accountType = std::move(accountType),
                   accessOptions = std::make_shared<const Dictionary>(std::move(accessOptions))](const BusCaller& caller,
@@ -146,48 +151,58 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
   void Authorize(AccessResult&& result, std::string accountType, std::string client, Dictionary options) override {
+    requireGrant(accountType, client);
     startRequest(std::move(result), options, [this, accountType, client](const BusCaller& caller, PendingRequest& request) {
       return _service.authorize(caller, accountType, client, request);
     });
   }
 
   void GetCredentialDescriptor(sdbus::Result<sdbus::UnixFd>&& result, std::string accountType, Dictionary options) override {
+    requireArgument("account_type", accountType);
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { return pipeHolding(_service.credential(caller, accountType)); });
   }
 
   void ListAccounts(sdbus::Result<BusRows>&& result, std::string accountType, Dictionary options) override {
+    requireArgument("account_type", accountType);
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { return rowsToBus(_service.listAccounts(caller, accountType)); });
   }
 
   void AddAccount(sdbus::Result<std::string>&& result, std::string accountType, std::string username, sdbus::UnixFd token,
                   Dictionary options) override {
+    requireArgument("account_type", accountType);
+    requireArgument("username", username);
     start(std::move(result), options, {}, [this, accountType, username, token](const BusCaller& caller) {
       return _service.addAccount(caller, accountType, username, [&token] { return readToEnd(token); });
     });
   }
 
   void RemoveAccount(sdbus::Result<>&& result, std::string id, Dictionary options) override {
+    requireArgument("id", id);
     start(std::move(result), options, {}, [this, id](const BusCaller& caller) { _service.removeAccount(caller, id); });
   }
 
   void ListGrants(sdbus::Result<BusRows>&& result, std::string accountType, Dictionary options) override {
+    requireArgument("account_type", accountType);
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { return rowsToBus(_service.listGrants(caller, accountType)); });
   }
 
   void Revoke(sdbus::Result<>&& result, std::string accountType, std::string client, Dictionary options) override {
+    requireGrant(accountType, client);
     start(std::move(result), options, {},
           [this, accountType, client](const BusCaller& caller) { _service.revoke(caller, accountType, client); });
   }
 
   void RevokeAll(sdbus::Result<>&& result, std::string accountType, Dictionary options) override {
+    requireArgument("account_type", accountType);
     start(std::move(result), options, {},
           [this, accountType](const BusCaller& caller) { _service.revokeAll(caller, accountType); });
   }
 
   void History(sdbus::Result<BusRows>&& result, Dictionary options) override {
+    checked([&] { requireClientID("client", textOption(options, "client").value_or("")); });
     start(std::move(result), options, {"limit", "client"}, [this, options](const BusCaller& caller) {
       return rowsToBus(_service.history(caller, numberOption(options, "limit").value_or(100), textOption(options, "client")));
     });
@@ -203,6 +218,7 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
   void GetPreference(sdbus::Result<BusDictionary>&& result, std::string domain, std::string key, Dictionary options) override {
+    requirePreference(domain, key);
     start(std::move(result), options, {}, [this, domain, key](const BusCaller& caller) {
       const auto value = _service.preference(caller, domain, key);
       return value ? dictionaryToBus({{"value", *value}}) : BusDictionary();
@@ -210,6 +226,7 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
   void SetPreference(sdbus::Result<>&& result, std::string domain, std::string key, Dictionary options) override {
+    requirePreference(domain, key);
     start(std::move(result), options, {"value"}, [this, domain, key, options](const BusCaller& caller) {
       const Value* value = options.find("value");
       _service.setPreference(caller, domain, key, value == nullptr ? std::nullopt : std::optional(*value));
@@ -217,7 +234,8 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
   void GetStatus(sdbus::Result<BusDictionary>&& result, Dictionary options) override {
-    start(std::move(result), options, {}, [this](const BusCaller& caller) { return dictionaryToBus(_service.status(caller)); });
+    start(std::move(result), options, {},
+          [this](const BusCaller& caller) { return dictionaryToBus(shortenedRow(_service.status(caller))); });
   }
 
   std::uint32_t version() override { return 1; }
@@ -273,6 +291,20 @@ class BusServer::Implementation final : private OwnedConnection,
         _onTrouble("A signal could not be sent: " + failure.getMessage());
       }
     }
+  }
+
+  static void requireArgument(std::string_view name, std::string_view text) {
+    checked([&] { requireName(name, text); });
+  }
+
+  static void requireGrant(std::string_view accountType, std::string_view client) {
+    requireArgument("account_type", accountType);
+    checked([&] { requireClientID("client", client); });
+  }
+
+  static void requirePreference(std::string_view domain, std::string_view key) {
+    requireArgument("domain", domain);
+    requireArgument("key", key);
   }
 
   template <typename Body>

@@ -39,12 +39,18 @@ std::string randomToken() {
   return "t" + std::to_string(number);
 }
 
+// What a server or a file had to say may be of any length.
+std::string explanationOf(std::string_view text) {
+  constexpr std::size_t longestExplanation = 4096;
+  return validText(shortened(text, longestExplanation));
+}
+
 BusDictionary resultsOf(const AccessOutcome& outcome) {
   BusDictionary results;
   if (!outcome.error) return results;
   results.emplace("error_domain", validText(outcome.error->domain));
   results.emplace("error_code", std::int32_t{outcome.error->code});
-  if (outcome.error->description) results.emplace("error_message", validText(*outcome.error->description));
+  if (outcome.error->description) results.emplace("error_message", explanationOf(*outcome.error->description));
   return results;
 }
 
@@ -69,7 +75,7 @@ const char* nameOf(BusFailureKind kind) {
 }  // namespace
 
 sdbus::Error busError(const BusFailure& failure) {
-  return sdbus::Error(std::string("com.veltran.Accounts1.Error.") + nameOf(failure.kind()), validText(failure.what()));
+  return sdbus::Error(std::string("com.veltran.Accounts1.Error.") + nameOf(failure.kind()), explanationOf(failure.what()));
 }
 
 RequestObjects::RequestObjects(sdbus::IConnection& connection, std::function<void(std::uint64_t)> close)

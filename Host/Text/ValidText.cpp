@@ -58,4 +58,12 @@ std::string validText(std::string_view text) {
   }
 }
 
+std::string shortened(std::string_view text, std::size_t mostBytes) {
+  constexpr std::string_view ellipsis = "…";
+  if (text.size() <= mostBytes) return std::string(text);
+  std::size_t end = mostBytes > ellipsis.size() ? mostBytes - ellipsis.size() : 0;
+  while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80) --end;
+  return std::string(text.substr(0, end)).append(ellipsis);
+}
+
 }  // namespace palisade

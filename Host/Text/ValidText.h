@@ -8,6 +8,7 @@
 ///
 /// Threads: pure functions. Ownership: none. Errors: none.
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 
@@ -19,5 +20,8 @@ bool isValidText(std::string_view text);
 
 /// The text with U+FFFD in place of each character that may not stand in it, and of each byte that belongs to none.
 std::string validText(std::string_view text);
+
+/// The beginning of a text that is longer than so many bytes, with "…" at its end. No character is cut in two.
+std::string shortened(std::string_view text, std::size_t mostBytes);
 
 }  // namespace palisade

@@ -84,5 +84,21 @@ TEST(ValidText, IsWhatEveryRepairComesTo) {
   }
 }
 
+TEST(AShortenedText, IsItselfUpToItsBound) {
+  EXPECT_EQ(shortened("", 8), "");
+  EXPECT_EQ(shortened("12345678", 8), "12345678");
+  EXPECT_EQ(shortened("123456789", 8), "12345…");
+}
+
+TEST(AShortenedText, CutsNoCharacterAndKeepsItsBound) {
+  const std::string text = "aé日🙂aé日🙂aé日🙂";
+  for (std::size_t most = 3; most < text.size(); ++most) {
+    const std::string cut = shortened(text, most);
+    EXPECT_LE(cut.size(), most);
+    EXPECT_TRUE(isValidText(cut));
+    EXPECT_TRUE(cut.ends_with("…"));
+  }
+}
+
 }  // namespace
 }  // namespace palisade
