@@ -3,6 +3,7 @@
 #include <atomic>
 #include <chrono>
 #include <cstdlib>
+#include <thread>
 
 #include "Host/Accounts/AccessHistory.h"
 #include "Host/Accounts/ClientDirectory.h"
@@ -27,6 +28,7 @@
 #include "Host/Http/HttpClient.h"
 #include "Host/Identity/ClientRegistry.h"
 #include "Host/Json/Json.h"
+#include "Host/Keychain/VaultKeychain.h"
 #include "Host/Log/JournalLog.h"
 #include "Host/Preferences/TomlFile.h"
 #include "Host/Preferences/TomlPreferencesStore.h"
@@ -98,11 +100,10 @@ struct AccountDaemon::Parts {
               directory),
         log(configuration.logLevel, [this](const AccessRequestRecord& record) { history.append(record, now()); }),
         history(store, [this](const Error& error) { tell(error.description.value_or("The history cannot be written.")); }),
-        keychain(openKeychain({.choice = configuration.keychain,
-                               .vault = {.path = stateFolder() / "vault.sqlite",
-                                         .keyFile = stateFolder() / "vault.key",
-                                         .credentialsFolder = credentialsFolder()},
-                               .choiceFile = stateFolder() / "keychain"})),
+        keychain({.choice = configuration.keychain,
+                  .path = stateFolder() / "vault.sqlite",
+                  .keyFile = stateFolder() / "vault.key",
+                  .credentialsFolder = credentialsFolder()}),
         outbox({.path = stateFolder() / "outbox.sqlite", .onAdd = [this] { bus.start(socialDaemonBusName); }}),
         server(serverConfiguration()),
         http(server.httpOptions()),
@@ -122,7 +123,7 @@ struct AccountDaemon::Parts {
               otherAlert != nullptr ? [](const std::shared_ptr<AlertHandle>&) {} : SessionAlert::takeDown, coolDown, log),
         service({.store = store,
                  .history = history,
-                 .keychain = *keychain,
+                 .keychain = keychain,
                  .outbox = outbox,
                  .clients = clients,
                  .coolDown = coolDown,
@@ -131,11 +132,11 @@ struct AccountDaemon::Parts {
                  .revocations = [this] { return revocations(); },
                  .status = [this] { return status(); }}),
         pluginLog(log),
-        pluginKeychain(*keychain, store, [this](const std::string& clientID) { return service.operationOf(clientID); }),
+        pluginKeychain(keychain, store, [this](const std::string& clientID) { return service.operationOf(clientID); }),
         bus(service, [this](const std::string& sentence) { tell(sentence); }) {
     lock.emplace(stateFolder(), "accountd", patienceWithAnother);
     // Only the one daemon of these stores may repair: another could be in the middle of a grant.
-    for (const std::string& sentence : repairAfterCrash(store, *keychain, outbox)) tell(sentence);
+    for (const std::string& sentence : repairAfterCrash(store, keychain, outbox)) tell(sentence);
     if (!outbox.pending().empty()) bus.start(socialDaemonBusName);
     plugins.emplace(configuration.plugins, PlatformServices{.log = &pluginLog,
                                                             .keychain = &pluginKeychain,
@@ -147,6 +148,10 @@ struct AccountDaemon::Parts {
                                                             .json = &json});
     for (const std::string& trouble : plugins->troubles()) tell(trouble);
     for (const std::string& trouble : clients.troubles()) tell(trouble);
+    // It waits for the Secret Service, and nobody waits for it.
+    tidying = std::jthread([this] {
+      for (const std::string& sentence : keychain.tidy()) tell(sentence);
+    });
   }
 
   void tell(const std::string& sentence) { log.record(startOperation, LogLevel::error, "%@", "sentence", sentence); }
@@ -206,7 +211,7 @@ struct AccountDaemon::Parts {
     Array modules;
     for (const std::string& module : plugins->modules()) modules.emplace_back(module);
     Dictionary report{{"plugins", modules},
-                      {"keychain", keychain->description()},
+                      {"keychain", keychain.description()},
                       {"alert", frontEnd.description()},
                       {"server", server.address},
                       {"store", (stateFolder() / "accounts.sqlite").string()},
@@ -216,7 +221,7 @@ struct AccountDaemon::Parts {
     if (modules.empty()) report.set("plugins_trouble", "No plug-in was loaded.");
     if (!clients.troubles().empty()) report.set("clients_trouble", clients.troubles().front());
     if (const auto trouble = frontEnd.trouble()) report.set("alert_trouble", *trouble);
-    if (const auto trouble = troubleWithKeychain(*keychain)) report.set("keychain_trouble", *trouble);
+    if (const auto trouble = keychain.trouble()) report.set("keychain_trouble", *trouble);
     if (server.address.empty()) {
       report.set("server_trouble", "No server is configured. Write address = \"https://…\" into " +
                                        (configurationFolder() / "server.toml").string() + ".");
@@ -232,7 +237,7 @@ struct AccountDaemon::Parts {
   SqliteAccountStore store;
   JournalLog log;
   AccessHistory history;
-  std::unique_ptr<Keychain> keychain;
+  VaultKeychain keychain;
   Outbox outbox;
   ServerConfiguration server;
   HttpClient http;
@@ -249,6 +254,7 @@ struct AccountDaemon::Parts {
   BusServer bus;
   std::optional<PluginHost> plugins;
   std::atomic<bool> isServing = false;
+  std::jthread tidying;
 };
 
 AccountDaemon::AccountDaemon(const DaemonConfiguration& configuration, SystemAlert* alert)

@@ -109,7 +109,7 @@ class AccountOperations final : public AccountsService {
   void withdraw(const Withdrawable& isMeant);
   void revokeOperations(const Withdrawable& areMeant);
   std::string receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken);
-  std::shared_ptr<const AccountCredential> tokenOf(const AccountRecord& account);
+  bool hasToken(const AccountRecord& account);
 
   Parts _parts;
   ClientLanes _lanes;

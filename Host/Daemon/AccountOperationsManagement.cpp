@@ -7,6 +7,7 @@
 #include "Host/Daemon/AtEnd.h"
 #include "Host/Daemon/OperationStore.h"
 #include "Host/Daemon/StoreCall.h"
+#include "Host/Keychain/KeychainError.h"
 #include "Host/Preferences/TomlFile.h"
 #include "Host/Vantad/Departures.h"
 #include "Platform/AccountConstants.h"
@@ -88,9 +89,10 @@ std::string AccountOperations::addAccount(const BusCaller& caller, const std::st
   const auto found = std::ranges::find_if(accounts, [&](const AccountRecord& other) {
     return other.accountTypeIdentifier == accountType && other.username == username;
   });
-  // An account without a token is what an addition leaves that was cut off: this one brings it to its end.
+  // An account without a token is what an addition leaves that was cut off: this one brings it to its end. One whose token lies
+  // under a lost key, or was tampered with, is signed in to again.
   const bool isNew = found == accounts.end();
-  if (!isNew && tokenOf(*found) != nullptr) {
+  if (!isNew && hasToken(*found)) {
     throw BusFailure(BusFailureKind::invalidArguments, "There is an account '" + username + "' of this type already.");
   }
   const AccountRecord record =
@@ -104,10 +106,13 @@ std::string AccountOperations::addAccount(const BusCaller& caller, const std::st
   return record.id;
 }
 
-std::shared_ptr<const AccountCredential> AccountOperations::tokenOf(const AccountRecord& account) {
+bool AccountOperations::hasToken(const AccountRecord& account) {
+  const auto object = std::make_shared<StoredAccount>(account.id, account.username, account.description);
   try {
-    return _parts.keychain.credentialForAccount(
-        std::make_shared<StoredAccount>(account.id, account.username, account.description), std::nullopt);
+    return _parts.keychain.credentialForAccount(object, std::nullopt) != nullptr;
+  } catch (const KeychainError& failure) {
+    if (failure.code() == KeychainErrorKeyLost || failure.code() == KeychainErrorTampered) return false;
+    throw BusFailure(BusFailureKind::keychainUnavailable, failure.what());
   } catch (const std::exception& failure) {
     throw BusFailure(BusFailureKind::keychainUnavailable, failure.what());
   }

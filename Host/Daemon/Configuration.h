@@ -10,7 +10,7 @@
 
 #include "Host/Alert/SessionAlert.h"
 #include "Host/Daemon/AlertCoolDown.h"
-#include "Host/Keychain/OpenKeychain.h"
+#include "Host/Keychain/KeychainChoice.h"
 #include "Platform/Log.h"
 #include "Platform/Value.h"
 

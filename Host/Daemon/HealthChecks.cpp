@@ -4,7 +4,6 @@
 #include <future>
 #include <memory>
 
-#include "Host/Accounts/StoredAccount.h"
 #include "Host/Http/HttpClient.h"
 
 namespace palisade {
@@ -24,15 +23,6 @@ std::optional<std::string> troubleIn(const HttpResult& result) {
 }
 
 }  // namespace
-
-std::optional<std::string> troubleWithKeychain(Keychain& keychain) {
-  try {
-    keychain.credentialForAccount(std::make_shared<StoredAccount>("doctor", "", ""), std::nullopt);
-    return std::nullopt;
-  } catch (const std::exception& failure) {
-    return failure.what();
-  }
-}
 
 std::optional<std::string> troubleWithServer(const ServerConfiguration& server) {
   HttpClientOptions options = server.httpOptions();

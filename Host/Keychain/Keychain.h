@@ -7,6 +7,7 @@
 /// that cannot be read is not taken for one that is missing. No operation waits for a person, and each ends within seconds.
 
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -19,8 +20,11 @@ class Keychain : public KeychainManager {
   /// The clients that have a credential beside the account's own, in alphabetical order. Throws `KeychainError`.
   virtual std::vector<std::string> clientIDsWithCredentials(const std::shared_ptr<Account>& account) = 0;
 
-  /// For people, on one line: "encrypted vault /home/me/.local/state/palisade/vault.sqlite".
-  virtual std::string description() const = 0;
+  /// For people, on one line: where credentials lie, and who is kept from them.
+  virtual std::string description() = 0;
+
+  /// What is wrong, for people; none when all that is stored can be read. Waits for seconds at most.
+  virtual std::optional<std::string> trouble() = 0;
 };
 
 }  // namespace palisade

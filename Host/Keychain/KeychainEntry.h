@@ -1,6 +1,6 @@
 #pragma once
 
-/// What the two keychains share: which entry is meant, and how a credential is written.
+/// Which entry of the keychain is meant, and how a credential is written.
 ///
 /// Threads: all functions are pure. Errors: `KeychainError`.
 

@@ -21,10 +21,11 @@ enum KeychainErrorCode : int {
   KeychainErrorUnavailable = 2,       ///< there is no keychain, or it refuses to work
   KeychainErrorTimeout = 3,           ///< it did not answer in time
   KeychainErrorTampered = 4,          ///< an entry is not what was written for this account and client
-  KeychainErrorKey = 5,               ///< the vault's key is missing, too open, or another vault's
+  KeychainErrorKey = 5,               ///< the vault's key file is too open, or no key file
   KeychainErrorNotRepresentable = 6,  ///< a credential that would not read back as it was written, or none at all
   KeychainErrorForeignAccount = 7,    ///< an account object that is not out of the daemon's store
   KeychainErrorStorage = 8,           ///< the vault's file cannot be read or written
+  KeychainErrorKeyLost = 9,           ///< half of the vault's key is gone or another one; what is stored anew has a new key
 };
 
 class KeychainError : public std::runtime_error {

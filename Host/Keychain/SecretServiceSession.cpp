@@ -65,7 +65,7 @@ KeychainError inWords(const std::string& during, const GError& error) {
   if (g_error_matches(each, G_DBUS_ERROR, G_DBUS_ERROR_SERVICE_UNKNOWN) != FALSE ||
       g_error_matches(each, G_DBUS_ERROR, G_DBUS_ERROR_NAME_HAS_NO_OWNER) != FALSE) {
     return failure(KeychainErrorUnavailable,
-                   "no Secret Service runs in this session; start one, or choose the vault as keychain");
+                   "no Secret Service runs in this session; start one, or write keychain = \"vault\" into accountd.toml");
   }
   return failure(KeychainErrorUnavailable, std::string("the session's Secret Service failed (") + error.message + ")");
 }

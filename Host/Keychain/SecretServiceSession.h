@@ -1,7 +1,7 @@
 #pragma once
 
-/// An open, encrypted session with the desktop's Secret Service, and the library behind it. Only `SecretServiceKeychain` and
-/// its session include this.
+/// An open, encrypted session with the desktop's Secret Service, and the library behind it. Only
+/// `SecretServiceHalves` and its session include this.
 ///
 /// Threads: any, one operation at a time; whoever comes while one runs waits for it, within its own time limit.
 /// Ownership: what the library hands out is owned by the handles below. Errors: `KeychainError`. An operation ends within twice

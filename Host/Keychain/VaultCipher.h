@@ -3,31 +3,22 @@
 /// The vault's key and what it does: seals a secret for one place, and opens it there only (XChaCha20-Poly1305, a random nonce
 /// a message).
 ///
+/// The key is a hash of its halves and its ID, so all of them are needed, and a key of one half is another key than one of two.
 /// Threads: immutable after construction, safe from every thread. Ownership: the key lies in guarded memory that is wiped when
 /// the cipher is destroyed. Errors: `KeychainError`.
 
-#include <cstddef>
-#include <filesystem>
-#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
+
+#include "Host/Keychain/KeyHalf.h"
 
 namespace palisade {
 
 class VaultCipher {
  public:
-  static constexpr std::size_t keySize = 32;
-
-  /// Reads the key from a file that holds nothing else.
-  enum class KeyFile {
-    ownKey,           ///< a file of this user's that nobody else may read
-    systemCredential  ///< a file that the service manager has put there for us
-  };
-  VaultCipher(const std::filesystem::path& keyFile, KeyFile kind);
-
-  /// Makes a key file with a new key, readable for this user only, unless there is one.
-  static void createKeyFile(const std::filesystem::path& keyFile);
+  /// `inService` is null for a key that the file's half makes alone.
+  VaultCipher(std::string_view keyID, const KeyHalf& inFile, const KeyHalf* inService);
 
   struct Sealed {
     std::string nonce;
@@ -41,11 +32,7 @@ class VaultCipher {
   std::optional<std::string> open(const Sealed& sealed, std::string_view place) const;
 
  private:
-  struct GuardedFree {
-    void operator()(unsigned char* memory) const;
-  };
-
-  std::unique_ptr<unsigned char[], GuardedFree> _key;
+  KeyHalf _key;
 };
 
 }  // namespace palisade

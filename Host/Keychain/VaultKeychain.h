@@ -1,36 +1,29 @@
 #pragma once
 
-/// The keychain of a host without a Secret Service: credentials in a store of their own, each sealed with the vault's key for
-/// the account and client that it belongs to. A row that is copied to another account or client does not open.
+/// The daemons' keychain: credentials in a store of their own, always, each sealed for the account and client that it belongs
+/// to. A row that is copied to another account or client does not open.
 ///
-/// The key is `keychain.key` in the service manager's credentials folder when there is one, else a file of the user's own that
-/// is made at first use. Whoever can read that file and the store can read the credentials: the vault protects copies of the
-/// store, not a session that runs as the user. Nor does it notice that a whole row was put back to what it was earlier.
+/// Whoever reads the session's Secret Service lacks the key's other half and the store; whoever has the disk lacks the
+/// service's half. A program that reaches both, or both files of a vault without a half in the service, can read the
+/// credentials: the vault is no wall against what runs as the user outside a sandbox. Nor does it notice that a whole row was
+/// put back to what it was earlier. See `VaultKeys` for what becomes of a key.
 ///
-/// Threads: every operation may be called from any thread; reads run beside writes. Errors: see `Keychain`. A missing key is
-/// never replaced while there are credentials that it was made for.
+/// Threads: every operation may be called from any thread; reads run beside writes. Errors: see `Keychain`. The vault opens
+/// without its keys: what needs none, such as a removal, works also when they are lost.
 
-#include <filesystem>
 #include <memory>
 #include <optional>
 #include <string>
 #include <vector>
 
 #include "Host/Keychain/Keychain.h"
-#include "Host/Sqlite/Database.h"
+#include "Host/Keychain/VaultOptions.h"
 
 namespace palisade {
 
-struct VaultOptions {
-  std::filesystem::path path;
-  std::filesystem::path keyFile;
-  std::optional<std::filesystem::path> credentialsFolder = std::nullopt;  ///< `$CREDENTIALS_DIRECTORY`
-  DamagedStore onDamage = DamagedStore::refuse;
-};
-
 class VaultKeychain final : public Keychain {
  public:
-  /// Throws `KeychainError`.
+  /// Throws `KeychainError` when the store cannot be opened.
   explicit VaultKeychain(const VaultOptions& options);
   ~VaultKeychain() override;
 
@@ -41,7 +34,12 @@ class VaultKeychain final : public Keychain {
   std::optional<Error> removeCredentialForAccount(const std::shared_ptr<Account>& account,
                                                   const std::optional<std::string>& clientID) override;
   std::vector<std::string> clientIDsWithCredentials(const std::shared_ptr<Account>& account) override;
-  std::string description() const override;
+  std::string description() override;
+  std::optional<std::string> trouble() override;
+
+  /// Brings what is stored in line with the settings: credentials are sealed with a key as it was chosen, and those that
+  /// earlier versions left in the Secret Service go. Waits for the service for seconds. Answers sentences for the log.
+  std::vector<std::string> tidy();
 
  private:
   struct Vault;

@@ -13,6 +13,7 @@
 #include <string>
 
 #include "Host/Accounts/StoredAccount.h"
+#include "Host/Keychain/VaultKeychain.h"
 #include "Host/Preferences/TomlFile.h"
 #include "Host/Vantad/Departures.h"
 #include "Platform/Log.h"
@@ -51,7 +52,7 @@ Vantad::Vantad(const VantadOptions& options, Log& log)
       _configurationFile(_options.configuration),
       _signals(openSignals()),
       _answers(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)),
-      _keychain([keychain = _options.keychainOptions()] { return openKeychain(keychain); }) {}
+      _keychain([vault = _options.vaultOptions()] { return std::make_unique<VaultKeychain>(vault); }) {}
 
 Vantad::~Vantad() {
   close(_signals);

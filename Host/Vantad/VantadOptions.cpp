@@ -56,14 +56,12 @@ void VantadOptions::takeDefaultsFrom(const Dictionary& accountdTable) {
   if (!logLevel && levelName != nullptr) logLevel = logLevelFrom(*levelName);
 }
 
-KeychainOptions VantadOptions::keychainOptions() const {
+VaultOptions VantadOptions::vaultOptions() const {
   const char* const credentials = std::getenv("CREDENTIALS_DIRECTORY");
-  return {
-      .choice = keychain.value_or(KeychainChoice::automatic),
-      .vault = {.path = state / "vault.sqlite",
-                .keyFile = state / "vault.key",
-                .credentialsFolder = credentials == nullptr ? std::nullopt : std::optional<std::filesystem::path>(credentials)},
-      .choiceFile = state / "keychain"};
+  return {.choice = keychain.value_or(KeychainChoice::automatic),
+          .path = state / "vault.sqlite",
+          .keyFile = state / "vault.key",
+          .credentialsFolder = credentials == nullptr ? std::nullopt : std::optional<std::filesystem::path>(credentials)};
 }
 
 VantadOptions parseVantadOptions(int count, char** words) {

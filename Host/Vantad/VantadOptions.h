@@ -8,7 +8,7 @@
 #include <optional>
 #include <string>
 
-#include "Host/Keychain/OpenKeychain.h"
+#include "Host/Keychain/VaultOptions.h"
 #include "Platform/Log.h"
 #include "Platform/Value.h"
 
@@ -30,7 +30,7 @@ struct VantadOptions {
   void takeDefaultsFrom(const Dictionary& accountdTable);
 
   std::filesystem::path outbox() const { return state / "outbox.sqlite"; }
-  KeychainOptions keychainOptions() const;
+  VaultOptions vaultOptions() const;
 };
 
 VantadOptions parseVantadOptions(int count, char** words);

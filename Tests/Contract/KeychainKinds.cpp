@@ -1,6 +1,5 @@
 #include "Tests/Contract/KeychainKinds.h"
 
-#include "Host/Keychain/SecretServiceKeychain.h"
 #include "Host/Keychain/VaultKeychain.h"
 #include "Testing/FakeAccount.h"
 #include "Testing/FakeKeychainManager.h"
@@ -31,18 +30,21 @@ class Vault final : public KeychainUnderTest {
 
  private:
   TemporaryFolder _folder;
-  VaultKeychain _keychain{{.path = _folder.path() / "vault.sqlite", .keyFile = _folder.path() / "vault.key"}};
+  VaultKeychain _keychain{
+      {.choice = KeychainChoice::vault, .path = _folder.path() / "vault.sqlite", .keyFile = _folder.path() / "vault.key"}};
 };
 
-class SecretService final : public KeychainUnderTest {
+class VaultWithService final : public KeychainUnderTest {
  public:
-  SecretService() { _session.startKeyring(); }
+  VaultWithService() { _session.startKeyring(); }
   KeychainManager& keychain() override { return _keychain; }
   std::shared_ptr<Account> account(const std::string& id) override { return makeAccount(id); }
 
  private:
   PrivateSession _session;
-  SecretServiceKeychain _keychain;
+  VaultKeychain _keychain{{.choice = KeychainChoice::secretService,
+                           .path = _session.home() / "vault.sqlite",
+                           .keyFile = _session.home() / "vault.key"}};
 };
 
 }  // namespace
@@ -55,7 +57,7 @@ std::vector<KeychainKind> keychainKinds() {
 
 std::vector<KeychainKind> listingKeychainKinds() {
   return {{"Vault", [] { return std::make_unique<Vault>(); }},
-          {"SecretService", [] { return std::make_unique<SecretService>(); }}};
+          {"VaultWithService", [] { return std::make_unique<VaultWithService>(); }}};
 }
 
 }  // namespace palisade

@@ -1,6 +1,7 @@
 #pragma once
 
-/// Every kind of keychain that there is: a fake, the vault, and the Secret Service of a real keyring daemon.
+/// Every kind of keychain that there is: a fake, the vault whose key is a file, and the one with half of its key in a real
+/// keyring daemon.
 
 #include <functional>
 #include <memory>

@@ -185,15 +185,20 @@ class AKeychainThat(unittest.TestCase):
                 blocker.communicate()
             self.assertEqual(caller.start_request().outcome()[0], GRANTED)
 
-    def test_has_lost_its_key_stops_the_daemon_from_starting_with_a_sentence(self):
-        with trial.trial_with_account(log="error") as session:
+    def test_has_lost_its_key_grants_nothing_and_gives_back_all_when_the_key_is_put_back(self):
+        with trial.trial_with_account(log="error") as session, session.caller() as caller:
+            self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+            token = caller.credential()
             session.kill_accountd()
             key = session.state / "vault.key"
             key.rename(key.with_suffix(".away"))
-            with self.assertRaises(RuntimeError) as failed:
-                session.start_accountd()
-            self.assertIn("vault.key is missing; put it back", str(failed.exception))
+            session.start_accountd()
+            with self.assertRaises(BusError) as refused:
+                caller.credential()
+            self.assertIn("vault.key is missing; put back what was there, or sign in again", refused.exception.message)
             self.assertFalse(key.exists())
+            key.with_suffix(".away").rename(key)
+            self.assertEqual(caller.credential(), token)
 
 
 # Holds a store's write lock until its standard input ends.

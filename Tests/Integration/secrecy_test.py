@@ -1,12 +1,12 @@
 #!/usr/bin/env python3
-"""Where a token can be met on its way from the server to its application: on the bus, in the daemon's log."""
+"""Where a token can be met on its way from the server to its application: on the bus, in the Secret Service."""
 
 import contextlib
 import os
 import unittest
 
 import trial
-from accounts import FACEBOOK, GRANTED, Caller
+from accounts import FACEBOOK, GRANTED, REFUSED, Caller
 from bus_wire import MEMBER, BusError
 
 trial.use_build_of_command_line()
@@ -56,6 +56,71 @@ class ATokenOnTheBus(unittest.TestCase):
             with self.assertRaises(BusError) as refused:
                 caller.manage("GetCredential", "s", [FACEBOOK])
             self.assertEqual(refused.exception.name, "UnknownMethod")
+
+
+class AnApplicationThatUsesTheSecretService(unittest.TestCase):
+    def setUp(self):
+        self.session = trial.Trial(log="error")
+        self.addCleanup(self.session.close)
+        self.session.start_keyring()
+        self.session.configure(keychain="automatic")
+        self.session.start_accountd()
+        self.account = self.session.add_account()
+        self.caller = self.session.caller()
+        self.addCleanup(self.caller.close)
+        self.assertEqual(self.caller.start_request().outcome()[0], GRANTED)
+        self.token = self.caller.credential()
+
+    def restart(self) -> None:
+        self.session.kill_accountd()
+        self.session.start_accountd()
+
+    def expect_no_use(self, advice: str) -> None:
+        with self.assertRaises(BusError) as refused:
+            self.caller.credential()
+        self.assertEqual(refused.exception.name, "KeychainUnavailable")
+        self.assertIn(advice, refused.exception.message)
+        word, results = self.caller.start_request(app_id="222").outcome()
+        self.assertEqual(word, REFUSED)
+        self.assertIn(advice, results["error_message"])
+
+    def test_finds_no_token_there_and_nothing_that_opens_the_store(self):
+        stolen = [bytes.fromhex(secret) for secret in self.session.run_thief("read").values()]
+        for token in (self.session.master_token.strip(), self.token.encode()):
+            self.assertEqual([secret for secret in stolen if token in secret], [])
+        self.assertEqual([len(secret) for secret in stolen], [64], "half of a key, as hexadecimal digits")
+        self.assertIn("may use the service and read your files", self.session.run("palisade", "doctor").stdout)
+
+    def test_that_replaces_what_lies_there_changes_no_answer(self):
+        stolen = self.session.run_thief("read")
+        self.session.run_thief("replace", {item: "61" * (len(secret) // 2) for item, secret in stolen.items()})
+        self.restart()
+        self.expect_no_use("sign in again")
+        self.assertRegex(self.session.run("palisade", "doctor").stdout, r"fail +keychain(.*\n)+.*was replaced")
+        self.session.run_thief("replace", stolen)
+        self.assertEqual(self.caller.credential(), self.token)
+
+    def test_that_deletes_what_lies_there_leaves_the_way_to_sign_in_again(self):
+        self.session.run_thief("delete")
+        self.restart()
+        self.expect_no_use("sign in again")
+        self.assertEqual(self.session.add_account(), self.account)
+        self.assertEqual(self.caller.start_request(app_id="222").outcome()[0], GRANTED)
+        self.assertNotEqual(self.caller.credential(), self.token)
+
+    def test_that_deletes_what_lies_there_keeps_nobody_from_taking_access_back(self):
+        self.session.start_vantad()
+        self.session.run_thief("delete")
+        self.caller.manage("Revoke", "ss", [FACEBOOK, "org.example.photos"])
+        self.restart()
+        with self.assertRaises(BusError) as refused:
+            self.caller.credential()
+        self.assertEqual(refused.exception.name, "NotGranted")
+
+    def test_does_not_see_what_the_social_daemon_needs_to_have_a_token_made_invalid(self):
+        self.session.start_vantad()
+        self.caller.manage("Revoke", "ss", [FACEBOOK, "org.example.photos"])
+        trial.wait_until(lambda: self.caller.revocations()[0]["state"] == "confirmed", "the server confirms")
 
 
 if __name__ == "__main__":

@@ -18,7 +18,7 @@ import threading
 import time
 
 from accounts import NAME, Caller
-from bus_wire import MEMBER, PATIENCE
+from bus_wire import MEMBER, PATIENCE, BusError, socket_of
 
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
 BUILD = PROJECT / "build/debug"
@@ -212,6 +212,35 @@ class Trial:
         self.bus = bus.stdout.readline().decode().strip()
         self.bus_process = bus
         self.environment["DBUS_SESSION_BUS_ADDRESS"] = self.bus
+
+    def start_keyring(self) -> None:
+        """Starts a real keyring daemon with an unlocked keyring, which it makes the first time."""
+        self.keyring = subprocess.Popen(["gnome-keyring-daemon", "--foreground", "--components=secrets", "--unlock"],
+                                        env=self.environment, stdin=subprocess.PIPE, stdout=subprocess.DEVNULL,
+                                        stderr=subprocess.DEVNULL)
+        self._processes.append(self.keyring)
+        self.keyring.stdin.write(b"password")
+        self.keyring.stdin.close()
+
+        def is_unlocked() -> bool:
+            with self.caller() as caller, contextlib.suppress(BusError):
+                return caller.call("org.freedesktop.secrets", "/org/freedesktop/secrets/collection/login",
+                                   "org.freedesktop.DBus.Properties", "Get", "ss",
+                                   ["org.freedesktop.Secret.Collection", "Locked"]) == [False]
+            return False
+
+        wait_until(is_unlocked, "the keyring is unlocked")
+
+    def run_thief(self, action: str, *words):
+        """What another application gets that may talk to the bus, and has neither files nor network."""
+        bus = socket_of(self.bus)
+        sandbox = ["bwrap", "--unshare-all", "--die-with-parent", "--ro-bind", "/usr", "/usr", "--symlink", "usr/lib", "/lib",
+                   "--symlink", "usr/lib64", "/lib64", "--symlink", "usr/bin", "/bin", "--proc", "/proc", "--dev", "/dev",
+                   "--ro-bind", PROJECT / "Tests/Integration", "/program", "--bind", bus, "/bus"]
+        done = self.run(*sandbox, "python3", "-B", "/program/thief.py", "/bus", action, *map(json.dumps, words))
+        if done.returncode != 0:
+            raise RuntimeError(done.stdout)
+        return json.loads(done.stdout)
 
     def _start_sandbox(self) -> None:
         with open(self.root / "sandbox.log", "ab") as log:

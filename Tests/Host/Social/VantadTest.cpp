@@ -53,7 +53,7 @@ bool becomesTrue(const std::function<bool()>& condition) {
 class Vantad : public testing::Test {
  protected:
   Vantad() {
-    VaultKeychain vault({.path = state() / "vault.sqlite", .keyFile = state() / "vault.key"});
+    VaultKeychain vault({.choice = KeychainChoice::vault, .path = state() / "vault.sqlite", .keyFile = state() / "vault.key"});
     const auto account = std::make_shared<StoredAccount>(accountID, "", "");
     account->setCredential(std::make_shared<AccountCredential>(sandbox.masterToken(), "", distantFuture));
     EXPECT_EQ(vault.setCredentialForAccount(account, std::nullopt), std::nullopt);

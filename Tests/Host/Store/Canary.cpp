@@ -88,7 +88,8 @@ void passThroughLibraries() {
 }
 
 void passThroughTheVault(const std::filesystem::path& folder) {
-  VaultKeychain vault({.path = folder / "vault" / "vault.sqlite", .keyFile = folder / "vault" / "vault.key"});
+  VaultKeychain vault(
+      {.choice = KeychainChoice::vault, .path = folder / "vault" / "vault.sqlite", .keyFile = folder / "vault" / "vault.key"});
   const auto account = makeAccount("a", AccountCredential(makeSecret(), makeSecret(), distantFuture));
   vault.setCredentialForAccount(account, "client");
   account->setCredential(nullptr);

@@ -49,10 +49,11 @@ class AVault : InMemory, public testing::Test {
     return contentOf(vault->credentialForAccount(makeAccount(account), client));
   }
 
-  // What opening the vault fails with.
+  // What opening the vault and reading from it fails with.
   KeychainError failure() {
     try {
       restart();
+      get("a", "client");
     } catch (const KeychainError& error) {
       return error;
     }
@@ -63,13 +64,15 @@ class AVault : InMemory, public testing::Test {
   void tamper(const std::string& sql) {
     constexpr std::array<std::string_view, 1> anyMigration{""};
     vault.reset();
-    Database::open({.path = options.path, .applicationID = 0x506c5661, .migrations = anyMigration})
+    Database::open({.path = options.path, .applicationID = 0x506c5662, .migrations = anyMigration})
         ->execute("tamper", sql.c_str());
     restart();
   }
 
   TemporaryFolder folder;
-  VaultOptions options{.path = folder.path() / "state" / "vault.sqlite", .keyFile = folder.path() / "state" / "vault.key"};
+  VaultOptions options{.choice = KeychainChoice::vault,
+                       .path = folder.path() / "state" / "vault.sqlite",
+                       .keyFile = folder.path() / "state" / "vault.key"};
   std::unique_ptr<VaultKeychain> vault;
 };
 
@@ -92,7 +95,7 @@ TEST_F(AVault, WritesTheSameTokenDifferentlyEachTime) {
   const auto sealed = [&] {
     vault.reset();
     constexpr std::array<std::string_view, 1> anyMigration{""};
-    const auto database = Database::open({.path = options.path, .applicationID = 0x506c5661, .migrations = anyMigration});
+    const auto database = Database::open({.path = options.path, .applicationID = 0x506c5662, .migrations = anyMigration});
     Statement read(*database, "read", "SELECT nonce || ciphertext FROM credentials");
     Statement::Run row = read.run();
     EXPECT_TRUE(row.next());
@@ -106,6 +109,7 @@ TEST_F(AVault, WritesTheSameTokenDifferentlyEachTime) {
 }
 
 TEST_F(AVault, KeepsItsKeyForItsOwnerAlone) {
+  set("a", "client", {.token = "token"});
   struct stat status {};
   ASSERT_EQ(stat(options.keyFile.c_str(), &status), 0);
   EXPECT_EQ(status.st_mode & 07777, 0600U);
@@ -168,15 +172,15 @@ TEST_F(AVault, DoesNotOpenWithAnotherKey) {
   set("a", "client", {.token = "token"});
   overwrite(options.keyFile, 0, "another key another key another!");
   const KeychainError error = failure();
-  EXPECT_EQ(error.code(), KeychainErrorKey);
-  EXPECT_THAT(error.what(), HasSubstr("another one"));
+  EXPECT_EQ(error.code(), KeychainErrorKeyLost);
+  EXPECT_THAT(error.what(), AllOf(HasSubstr("another key"), HasSubstr("sign in again")));
 }
 
 TEST_F(AVault, DoesNotReplaceAKeyThatIsMissing) {
   set("a", "client", {.token = "token"});
   std::filesystem::rename(options.keyFile, folder.path() / "saved");
   const KeychainError error = failure();
-  EXPECT_EQ(error.code(), KeychainErrorKey);
+  EXPECT_EQ(error.code(), KeychainErrorKeyLost);
   EXPECT_THAT(error.what(), AllOf(HasSubstr(options.keyFile.string()), HasSubstr("missing")));
   EXPECT_FALSE(std::filesystem::exists(options.keyFile));
 
@@ -185,30 +189,66 @@ TEST_F(AVault, DoesNotReplaceAKeyThatIsMissing) {
   EXPECT_THAT(get("a", "client"), Optional(CredentialContent{.token = "token"}));
 }
 
+TEST_F(AVault, WhoseKeyIsLostStoresUnderAnotherKeyAndDestroysNothing) {
+  set("a", "old", {.token = "old"});
+  std::filesystem::rename(options.keyFile, folder.path() / "saved");
+  restart();
+  EXPECT_NE(vault->trouble(), std::nullopt);
+  ASSERT_EQ(set("a", "new", {.token = "new"}), std::nullopt);
+  EXPECT_FALSE(std::filesystem::exists(options.keyFile)) << "the name is the lost key's";
+  EXPECT_THROW(get("a", "old"), KeychainError);
+
+  std::filesystem::rename(folder.path() / "saved", options.keyFile);
+  restart();
+  EXPECT_THAT(get("a", "old"), Optional(CredentialContent{.token = "old"}));
+  EXPECT_THAT(get("a", "new"), Optional(CredentialContent{.token = "new"}));
+  EXPECT_EQ(vault->trouble(), std::nullopt);
+}
+
+TEST_F(AVault, WhoseKeyIsLostGivesUpWhatIsRemoved) {
+  set("a", "client", {.token = "token"});
+  std::filesystem::remove(options.keyFile);
+  restart();
+  EXPECT_THAT(vault->clientIDsWithCredentials(makeAccount("a")), ElementsAre("client"));
+  EXPECT_EQ(vault->removeCredentialForAccount(makeAccount("a"), "client"), std::nullopt);
+  EXPECT_EQ(get("a", "client"), std::nullopt);
+}
+
+TEST_F(AVault, DoesNotOpenWithoutTheHalfThatItsRowDenies) {
+  set("a", "client", {.token = "token"});
+  tamper("UPDATE keys SET id = 'another'");
+  EXPECT_EQ(failure().code(), KeychainErrorKeyLost);
+}
+
 class AKeyFileWithRights : public AVault, public testing::WithParamInterface<mode_t> {};
 
 TEST_P(AKeyFileWithRights, ForOthersIsRefused) {
+  set("a", "client", {.token = "token"});
   ASSERT_EQ(chmod(options.keyFile.c_str(), GetParam()), 0);
   const KeychainError error = failure();
   EXPECT_EQ(error.code(), KeychainErrorKey);
   EXPECT_THAT(error.what(), AllOf(HasSubstr(options.keyFile.string()), HasSubstr("chmod 600")));
+  EXPECT_TRUE(set("a", "client", {.token = "another"})) << "and gets no other key";
 }
 
 INSTANTIATE_TEST_SUITE_P(Rights, AKeyFileWithRights, testing::Values(0640, 0604, 0620, 0602, 0666, 0610));
 
 TEST_F(AVault, RefusesAKeyFileOfAnotherUser) {
   if (ranWithItsOwnRoot()) return;
+  set("a", "client", {.token = "token"});
   ASSERT_EQ(chown(options.keyFile.c_str(), 65534, 65534), 0);
   EXPECT_THAT(failure().what(), HasSubstr("another user"));
 }
 
 TEST_F(AVault, RefusesAKeyFileThatIsALink) {
+  set("a", "client", {.token = "token"});
   std::filesystem::rename(options.keyFile, folder.path() / "elsewhere");
   std::filesystem::create_symlink(folder.path() / "elsewhere", options.keyFile);
   EXPECT_EQ(failure().code(), KeychainErrorKey);
 }
 
 TEST_F(AVault, RefusesAKeyFileOfAnotherSize) {
+  set("a", "client", {.token = "token"});
   for (const std::size_t size : {0U, 31U, 33U}) {
     std::filesystem::resize_file(options.keyFile, size);
     EXPECT_THAT(failure().what(), HasSubstr(std::to_string(size) + " bytes"));
@@ -242,20 +282,33 @@ TEST_F(AVaultWithACredential, TakesTheKeyThatTheServiceManagerHands) {
 
 TEST_F(AVaultWithACredential, MakesItsOwnKeyWhenNoneIsHanded) {
   restart();
+  set("a", "client", {.token = "token"});
   EXPECT_TRUE(std::filesystem::exists(options.keyFile));
 }
 
 TEST_F(AVaultWithACredential, RefusesOneThatEverybodyMayRead) {
   giveKey("0123456789abcdef0123456789abcdef", 0444);
-  EXPECT_EQ(failure().code(), KeychainErrorKey);
+  restart();
+  const std::optional<Error> error = set("a", "client", {.token = "token"});
+  ASSERT_TRUE(error);
+  EXPECT_EQ(error->code, KeychainErrorKey);
   EXPECT_FALSE(std::filesystem::exists(options.keyFile)) << "and does not go on with a key of its own";
 }
 
 TEST_F(AVaultWithACredential, DoesNotOpenWhenItIsHandedNoLonger) {
   giveKey("0123456789abcdef0123456789abcdef", 0440);
   restart();
+  set("a", "client", {.token = "token"});
   std::filesystem::remove(*options.credentialsFolder / "keychain.key");
   EXPECT_THAT(failure().what(), HasSubstr("missing"));
+}
+
+TEST_F(AVaultWithACredential, StillOpensWhatItsOwnKeyHasSealed) {
+  restart();
+  set("a", "client", {.token = "token"});
+  giveKey("0123456789abcdef0123456789abcdef", 0440);
+  restart();
+  EXPECT_THAT(get("a", "client"), Optional(CredentialContent{.token = "token"}));
 }
 
 TEST_F(AVault, OpenedFirstByTwoProcessesHasOneKey) {
@@ -311,12 +364,16 @@ TEST_F(AVault, MadeOnAFailingDiskHasAWholeKeyOrNone) {
     disk::order(disk::Fault::failsFromNow, call, ENOSPC);
     try {
       restart();
+      if (const auto error = set("a", "client", {.token = "lost"})) {
+        EXPECT_THAT(error->code, testing::AnyOf(KeychainErrorStorage, KeychainErrorKey)) << *error->description;
+      }
     } catch (const KeychainError& error) {
       EXPECT_THAT(error.code(), testing::AnyOf(KeychainErrorStorage, KeychainErrorKey)) << error.what();
     }
     const bool hasFailed = disk::withdraw();
     restart();
     EXPECT_EQ(set("a", "client", {.token = "token"}), std::nullopt);
+    EXPECT_THAT(get("a", "client"), Optional(CredentialContent{.token = "token"}));
     if (!hasFailed || HasFailure()) break;
   }
 }
