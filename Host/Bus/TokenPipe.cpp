@@ -5,52 +5,80 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <chrono>
 #include <cstddef>
+#include <optional>
+#include <utility>
 
 #include "Host/Bus/AccountsService.h"
+
+// Whoever sends a descriptor may hold another one of the same pipe: take out of it what we have seen in it, change its flags,
+// or leave it open. And a file may be served by a program that never answers, to a look at its state neither. So the kernel is
+// asked what the descriptor is, without asking the file, and what a pipe brings is moved into a pipe of our own, which does not
+// wait.
 
 namespace palisade {
 namespace {
 
 constexpr std::size_t longestAccountToken = 64 * 1024;
-constexpr std::chrono::seconds longestTokenTransfer(10);
+
+struct Pipe {
+  Pipe() {
+    int ends[2];
+    if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0) {
+      throw BusFailure(BusFailureKind::failed, "No pipe could be made for the token.");
+    }
+    reader = sdbus::UnixFd(ends[0], sdbus::adopt_fd);
+    writer = sdbus::UnixFd(ends[1], sdbus::adopt_fd);
+  }
+
+  sdbus::UnixFd reader;
+  sdbus::UnixFd writer;
+};
+
+// Moves what there is to the end of `content`; none when there is nothing now, false at the end of the pipe.
+std::optional<bool> takeMore(const sdbus::UnixFd& source, const Pipe& ours, std::string& content) {
+  constexpr std::size_t portion = 4096;
+  const ssize_t moved = splice(source.get(), nullptr, ours.writer.get(), nullptr, portion, SPLICE_F_NONBLOCK);
+  if (moved == 0) return false;
+  if (moved < 0 && (errno == EAGAIN || errno == EINTR)) return std::nullopt;
+  const std::size_t before = content.size();
+  if (moved > 0) content.resize(before + static_cast<std::size_t>(moved));
+  if (moved < 0 || read(ours.reader.get(), content.data() + before, content.size() - before) != moved) {
+    throw BusFailure(BusFailureKind::invalidArguments, "The token could not be read from its pipe.");
+  }
+  return true;
+}
 
 }  // namespace
 
-std::string readToEnd(const sdbus::UnixFd& descriptor) {
-  const auto deadline = std::chrono::steady_clock::now() + longestTokenTransfer;
+std::string readToEnd(const sdbus::UnixFd& descriptor, std::chrono::milliseconds limit) {
+  if (fcntl(descriptor.get(), F_GETPIPE_SZ) < 0) {
+    throw BusFailure(BusFailureKind::invalidArguments, "A token has to come in a pipe.");
+  }
+  const auto deadline = std::chrono::steady_clock::now() + limit;
+  const Pipe ours;
   std::string content;
-  char buffer[4096];
   while (true) {
     const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now());
     pollfd source{.fd = descriptor.get(), .events = POLLIN, .revents = 0};
     const int ready = left.count() > 0 ? poll(&source, 1, static_cast<int>(left.count())) : 0;
-    if (ready < 0 && errno == EINTR) continue;
     if (ready == 0) {
       throw BusFailure(BusFailureKind::invalidArguments,
-                       "The token did not come to its end within 10 seconds. Write it, and close the descriptor.");
+                       "The token did not come to its end in time. Write it, and close the pipe.");
     }
-    const ssize_t length = read(descriptor.get(), buffer, sizeof buffer);
-    if (length < 0 && errno == EINTR) continue;
-    if (length < 0) throw BusFailure(BusFailureKind::invalidArguments, "The token could not be read from its descriptor.");
-    if (length == 0) return content;
-    content.append(buffer, static_cast<std::size_t>(length));
+    const auto isMore = ready > 0 ? takeMore(descriptor, ours, content) : std::nullopt;
+    if (isMore == false) return content;
     if (content.size() > longestAccountToken)
       throw BusFailure(BusFailureKind::invalidArguments, "The token is longer than 64 KiB.");
   }
 }
 
 sdbus::UnixFd pipeHolding(const std::string& content) {
-  int ends[2];
-  if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0)
-    throw BusFailure(BusFailureKind::failed, "No pipe could be made for the token.");
-  sdbus::UnixFd reader(ends[0], sdbus::adopt_fd);
-  const sdbus::UnixFd writer(ends[1], sdbus::adopt_fd);
-  if (write(writer.get(), content.data(), content.size()) != static_cast<ssize_t>(content.size())) {
+  Pipe pipe;
+  if (write(pipe.writer.get(), content.data(), content.size()) != static_cast<ssize_t>(content.size())) {
     throw BusFailure(BusFailureKind::failed, "The token does not fit into a pipe.");
   }
-  return reader;
+  return std::move(pipe.reader);
 }
 
 }  // namespace palisade

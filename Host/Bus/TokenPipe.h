@@ -7,13 +7,14 @@
 
 #include <sdbus-c++/Types.h>
 
+#include <chrono>
 #include <string>
 
 namespace palisade {
 
-/// What the descriptor brings until its end. Whoever sends a token has it: one that stays silent for 10 seconds, or brings more
-/// than 64 KiB, is refused.
-std::string readToEnd(const sdbus::UnixFd& descriptor);
+/// What a pipe brings until its end. Whoever sends a token has it: what is no pipe, is still open when the limit is over, or
+/// brings more than 64 KiB is refused, and holds the thread no longer whatever its sender does to it.
+std::string readToEnd(const sdbus::UnixFd& descriptor, std::chrono::milliseconds limit = std::chrono::seconds{10});
 
 /// A pipe that holds `content` to its end. A token always fits into a pipe's buffer.
 sdbus::UnixFd pipeHolding(const std::string& content);
