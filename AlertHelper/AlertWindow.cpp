@@ -1,7 +1,7 @@
 // The window's behaviour: what input reaches it, and when a button counts as pressed. How it looks is in AlertWindowLayout.cpp.
 //
-// Every event passes `filterEvent` before a widget sees it, so that `Arming` knows of all clicks and keys, wherever they go.
-// Return and Space never reach the buttons: what they press is decided here, when they are let go.
+// Every event passes `filterEvent` before a widget sees it, so that `Arming` knows of all clicks, wherever they go, and
+// `AlertKeyboard` of all keys. Of the keys GTK sees the modifiers alone: it underlines the buttons' letters while Alt is down.
 
 #include "AlertHelper/AlertWindow.h"
 
@@ -10,6 +10,7 @@
 #include <gtk/gtk.h>
 #include <gtkmm/adjustment.h>
 
+#include "AlertHelper/KeyMeanings.h"
 #include "AlertHelper/Layer.h"
 #include "AlertHelper/PressedKeys.h"
 
@@ -17,11 +18,6 @@ namespace palisade {
 namespace {
 
 constexpr unsigned lookEvery = 50;
-
-bool isPressingKey(unsigned symbol) {
-  return symbol == GDK_KEY_Return || symbol == GDK_KEY_KP_Enter || symbol == GDK_KEY_ISO_Enter || symbol == GDK_KEY_space ||
-         symbol == GDK_KEY_KP_Space;
-}
 
 // Where there is no keyboard (a tablet, say), no window ever has its focus, and there are no keys that could go astray.
 bool hasKeyboard(GdkDisplay* display) {
@@ -36,14 +32,17 @@ bool hasKeyboard(GdkDisplay* display) {
 AlertWindow::AlertWindow(const AlertQuestion& question, std::function<void(AlertWord)> answer)
     : _answer(std::move(answer)),
       _isTopMost(question.topMost),
-      _arming([] { return std::chrono::steady_clock::now(); }) {
+      _arming(std::chrono::steady_clock::now),
+      _focus(std::chrono::steady_clock::now) {
   build(question);
+  if (!question.subject) _focus.leaveOutDetails();
   _refuse.signal_clicked().connect([this] { this->answer(AlertWord::refused); });
   _allow.signal_clicked().connect([this] { allowClicked(); });
   signal_delete_event().connect([this](GdkEventAny*) {
     this->answer(AlertWord::closed);
     return true;
   });
+  signal_set_focus().connect([this](Gtk::Widget* widget) { focusWasMoved(widget); });
   property_is_active().signal_changed().connect([this] { updateFocus(); });
   gdk_event_handler_set(&AlertWindow::filter, this, nullptr);
 }
@@ -63,7 +62,7 @@ void AlertWindow::appear() {
   Glib::signal_timeout().connect([this] { return showWhetherArmed(); }, lookEvery);
   showWhetherArmed();
   show_all();
-  _allow.grab_focus();
+  showPlace();
   present();
 }
 
@@ -73,11 +72,15 @@ void AlertWindow::filterEvent(GdkEvent* event) {
   const bool isOurs = get_window() && event->any.window != nullptr &&
                       gdk_window_get_effective_toplevel(event->any.window) == get_window()->gobj();
   switch (event->type) {
-    case GDK_KEY_PRESS:
-      if (!keyWentDown(event->key)) return;
+    case GDK_KEY_PRESS: {
+      const KeyMeaning meaning = meaningOf(event->key, _labels, get_direction() == Gtk::TEXT_DIR_RTL);
+      keyWentDown(event->key, meaning);
+      if (meaning != KeyMeaning::modifier) return;
       break;
+    }
     case GDK_KEY_RELEASE:
-      if (!keyWentUp(event->key)) return;
+      keyWentUp(event->key);
+      if (meaningOf(event->key, _labels, false) != KeyMeaning::modifier) return;
       break;
     case GDK_BUTTON_PRESS:
     case GDK_2BUTTON_PRESS:
@@ -107,25 +110,42 @@ void AlertWindow::filterEvent(GdkEvent* event) {
   if (type == GDK_BUTTON_RELEASE || type == GDK_TOUCH_END || type == GDK_TOUCH_CANCEL) _isPointerDown = false;
 }
 
-// Whether a widget may see the key.
-bool AlertWindow::keyWentDown(const GdkEventKey& key) {
-  const bool isFresh = _arming.keyWentDown(key.hardware_keycode);
+void AlertWindow::keyWentDown(const GdkEventKey& key, KeyMeaning meaning) {
+  _keyboard.wentDown(key.hardware_keycode, meaning);
   if (key.keyval == GDK_KEY_Page_Up || key.keyval == GDK_KEY_Page_Down) scroll(key.keyval == GDK_KEY_Page_Up ? -1 : 1);
-  return isFresh && key.keyval != GDK_KEY_Escape && !isPressingKey(key.keyval);
+  showPlace();
 }
 
-bool AlertWindow::keyWentUp(const GdkEventKey& key) {
-  const Arming::Press press = _arming.keyWentUp(key.hardware_keycode);
-  if (key.keyval != GDK_KEY_Escape && !isPressingKey(key.keyval)) return true;
-  if (press == Arming::Press::none) return false;
-  if (key.keyval == GDK_KEY_Escape) {
-    answer(AlertWord::closed);
-  } else if (get_focus() == &_refuse) {
-    answer(AlertWord::refused);
-  } else if (press == Arming::Press::armed) {
-    answer(AlertWord::allowed);
+void AlertWindow::keyWentUp(const GdkEventKey& key) {
+  if (const auto word = _keyboard.wentUp(key.hardware_keycode)) answer(*word);
+}
+
+Gtk::Widget& AlertWindow::widgetAt(AlertPlace place) {
+  switch (place) {
+    case AlertPlace::details: return _details;
+    case AlertPlace::refuse: return _refuse;
+    case AlertPlace::allow: return _allow;
+    case AlertPlace::text: break;
   }
-  return false;
+  return _text;
+}
+
+void AlertWindow::showPlace() {
+  Gtk::Widget& widget = widgetAt(_focus.place());
+  // GTK shows the focus only after keys that it has seen.
+  set_focus_visible(true);
+  if (get_focus() == &widget) return;
+  _isShowingPlace = true;
+  widget.grab_focus();
+  _isShowingPlace = false;
+}
+
+// Assistive technology moves GTK's focus by itself. Such a move has its wait like any other.
+void AlertWindow::focusWasMoved(const Gtk::Widget* widget) {
+  if (_isShowingPlace) return;
+  for (const AlertPlace place : {AlertPlace::text, AlertPlace::details, AlertPlace::refuse, AlertPlace::allow}) {
+    if (widget == &widgetAt(place)) _focus.putOn(place);
+  }
 }
 
 void AlertWindow::allowClicked() {
@@ -147,14 +167,16 @@ void AlertWindow::updateFocus() {
   const bool hasFocus = property_is_active().get_value() || !hasKeyboard(get_display()->gobj());
   if (hasFocus == _hadFocus) return;
   _hadFocus = hasFocus;
+  _arming.setFocused(hasFocus);
   if (hasFocus) {
-    _arming.focusCame(pressedKeys(get_display()->gobj()));
+    _keyboard.windowCame(pressedKeys(get_display()->gobj()));
   } else {
-    _arming.focusWent();
+    _keyboard.windowWent();
+    showPlace();
   }
 }
 
-// The button looks as it behaves. It stays sensitive, so that the keyboard's focus can rest on it.
+// The button looks as it behaves towards a click. It stays sensitive, so that the keyboard's focus can rest on it.
 bool AlertWindow::showWhetherArmed() {
   const auto style = _allow.get_style_context();
   if (_arming.isArmed() && style->has_class("waiting")) {

@@ -2,17 +2,22 @@
 
 /// The window that asks: who wants what of which account, and two buttons.
 ///
-/// What its texts say is data: nothing in them is read as markup. Threads: GTK's one. Ownership: owned by `main`; borrows the
-/// question while it is made. Errors: none; whatever is not a meant press of a button answers nothing or `closed`.
+/// What its texts say is data: nothing in them is read as markup. No key reaches a widget: where the keyboard stands, and what
+/// it presses there, is decided by `AlertKeyboard`, and GTK's focus follows. Threads: GTK's one. Ownership: owned by `main`;
+/// borrows the question while it is made. Errors: none; whatever is not a meant press of a button answers nothing or `closed`.
 
 #include <gtkmm/box.h>
 #include <gtkmm/button.h>
+#include <gtkmm/grid.h>
 #include <gtkmm/scrolledwindow.h>
 #include <gtkmm/window.h>
 
 #include <functional>
 
+#include "AlertHelper/AlertKeyboard.h"
 #include "AlertHelper/Arming.h"
+#include "AlertHelper/Labels.h"
+#include "Host/Alert/AlertFocus.h"
 #include "Host/Alert/AlertQuestion.h"
 
 namespace palisade {
@@ -27,14 +32,17 @@ class AlertWindow final : public Gtk::Window {
 
  private:
   void build(const AlertQuestion& question);
-  Gtk::Widget* detailsOf(const AlertSubject& subject, std::string_view languages);
+  void fillDetails(const AlertSubject& subject, std::string_view languages);
 
   /// All input goes through here before a widget sees it.
   static void filter(GdkEvent* event, void* window);
   void filterEvent(GdkEvent* event);
-  bool keyWentDown(const GdkEventKey& key);
-  bool keyWentUp(const GdkEventKey& key);
+  void keyWentDown(const GdkEventKey& key, KeyMeaning meaning);
+  void keyWentUp(const GdkEventKey& key);
 
+  Gtk::Widget& widgetAt(AlertPlace place);
+  void showPlace();
+  void focusWasMoved(const Gtk::Widget* widget);
   void scroll(int pages);
   void answer(AlertWord word);
   void allowClicked();
@@ -46,9 +54,15 @@ class AlertWindow final : public Gtk::Window {
   bool _isLayer = false;
   bool _isPointerDown = false;
   bool _hadFocus = false;
+  bool _isShowingPlace = false;
   Arming _arming;
+  AlertFocus _focus;
+  AlertKeyboard _keyboard{_arming, _focus};
+  ButtonLabels _labels;
   Gtk::Box _frame;
   Gtk::ScrolledWindow _scroller;
+  Gtk::Box _text;
+  Gtk::Grid _details;
   Gtk::Button _refuse;
   Gtk::Button _allow;
 };

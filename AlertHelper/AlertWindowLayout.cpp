@@ -1,11 +1,11 @@
-// How the window looks: icon, title, sentence, who asks and for what account, two buttons.
+// How the window looks: icon, title, sentence, who asks and for what account, two buttons. The text and the details can have
+// the keyboard's focus, too, and show it by a line around them.
 
 #include <atkmm/object.h>
 #include <gdkmm/monitor.h>
 #include <giomm/desktopappinfo.h>
 #include <gtk/gtk.h>
 #include <gtkmm/cssprovider.h>
-#include <gtkmm/grid.h>
 #include <gtkmm/icontheme.h>
 #include <gtkmm/image.h>
 #include <gtkmm/label.h>
@@ -25,7 +25,10 @@ constexpr const char* style = R"(
   .alert-title { font-size: 125%; font-weight: bold; }
   .alert-message { font-size: 105%; }
   .alert-claimed { font-weight: bold; }
+  .alert-place { border: 1px solid transparent; border-radius: 5px; padding: 5px; }
+  .alert-place:focus { border-color: alpha(@theme_fg_color, 0.4); }
   button { min-width: 6em; padding: 6px 14px; }
+  button:focus { outline: 2px solid alpha(@theme_fg_color, 0.6); outline-offset: 1px; }
   button.waiting { opacity: 0.5; }
   window.layer { border-radius: 9px; border: 1px solid alpha(@theme_fg_color, 0.35); }
 )";
@@ -91,7 +94,15 @@ void fitTo(Gtk::ScrolledWindow& scroller, Gtk::Widget& content, int mostHigh) {
   scroller.set_min_content_height(std::min(height, mostHigh));
 }
 
+// A part of the window that can have the keyboard's focus, and which assistive technology then reads.
+void makePlace(Gtk::Widget& widget, const std::string& name) {
+  widget.set_can_focus(true);
+  widget.get_style_context()->add_class("alert-place");
+  widget.get_accessible()->set_name(name);
+}
+
 void setUpButton(Gtk::Button& button, const std::string& label, const std::string& name) {
+  button.set_focus_on_click(false);
   button.set_use_underline(true);
   button.set_label(label);
   button.get_accessible()->set_name(name);
@@ -108,26 +119,34 @@ void AlertWindow::build(const AlertQuestion& question) {
   get_accessible()->set_name(question.title);
   get_accessible()->set_description(question.message);
 
-  auto* texts = Gtk::make_managed<Gtk::Box>(Gtk::ORIENTATION_VERTICAL, gap);
-  texts->pack_start(*makeLabel(question.title, "alert-title"), Gtk::PACK_SHRINK);
+  _text.set_orientation(Gtk::ORIENTATION_VERTICAL);
+  _text.set_spacing(gap);
+  _text.pack_start(*makeLabel(question.title, "alert-title"), Gtk::PACK_SHRINK);
   auto* message = makeLabel(question.message, "alert-message");
   message->set_width_chars(charactersOfALine);
-  texts->pack_start(*message, Gtk::PACK_SHRINK);
-  if (question.subject) texts->pack_start(*detailsOf(*question.subject, question.languages), Gtk::PACK_SHRINK);
+  _text.pack_start(*message, Gtk::PACK_SHRINK);
+  makePlace(_text, question.title + " " + question.message);
+
+  auto* texts = Gtk::make_managed<Gtk::Box>(Gtk::ORIENTATION_VERTICAL, gap / 3);
+  texts->pack_start(_text, Gtk::PACK_SHRINK);
+  if (question.subject) {
+    fillDetails(*question.subject, question.languages);
+    texts->pack_start(_details, Gtk::PACK_SHRINK);
+  }
 
   auto* content = Gtk::make_managed<Gtk::Box>(Gtk::ORIENTATION_HORIZONTAL, gap + gap / 2);
   content->pack_start(*makeIcon(question.subject), Gtk::PACK_SHRINK);
   content->pack_start(*texts, Gtk::PACK_EXPAND_WIDGET);
 
   // A long sentence on a small screen scrolls; the buttons stay where they can be seen.
-  // It takes no focus, which rests on a button at all times; Page Up and Page Down scroll it.
+  // It takes no focus itself; Page Up and Page Down scroll it.
   _scroller.set_can_focus(false);
   _scroller.set_policy(Gtk::POLICY_NEVER, Gtk::POLICY_AUTOMATIC);
   _scroller.add(*content);
 
-  const ButtonLabels labels = buttonLabels(question.refuseTitle, question.allowTitle);
-  setUpButton(_refuse, labels.refuse, question.refuseTitle);
-  setUpButton(_allow, labels.allow, question.allowTitle);
+  _labels = buttonLabels(question.refuseTitle, question.allowTitle);
+  setUpButton(_refuse, _labels.refuse, question.refuseTitle);
+  setUpButton(_allow, _labels.allow, question.allowTitle);
   _allow.get_style_context()->add_class("suggested-action");
   _allow.set_can_default(true);
   auto* buttons = Gtk::make_managed<Gtk::Box>(Gtk::ORIENTATION_HORIZONTAL, gap);
@@ -147,20 +166,21 @@ void AlertWindow::build(const AlertQuestion& question) {
   fitTo(_scroller, *content, std::max(area.get_height() - 12 * gap, 10 * gap));
 }
 
-Gtk::Widget* AlertWindow::detailsOf(const AlertSubject& subject, std::string_view languages) {
+void AlertWindow::fillDetails(const AlertSubject& subject, std::string_view languages) {
   const AlertWords& words = alertWordsFor(languages);
   const bool isCertain = subject.certainty == AlertCertainty::certain;
-  auto* grid = Gtk::make_managed<Gtk::Grid>();
-  grid->set_column_spacing(gap);
-  grid->set_row_spacing(gap / 2);
+  _details.set_column_spacing(gap);
+  _details.set_row_spacing(gap / 2);
+  std::string spoken;
   int row = 0;
   const auto addRow = [&](std::string_view name, const Glib::ustring& text, const char* styleClass) {
     auto* title = makeLabel(std::string(name), "dim-label", charactersOfALine / 2);
     title->set_valign(Gtk::ALIGN_START);
     auto* value = makeLabel(text, styleClass, charactersOfALine * 2 / 3);
     if (!name.empty()) value->get_accessible()->set_name(Glib::ustring(std::string(name)) + ": " + text);
-    grid->attach(*title, 0, row, 1, 1);
-    grid->attach(*value, 1, row, 1, 1);
+    _details.attach(*title, 0, row, 1, 1);
+    _details.attach(*value, 1, row, 1, 1);
+    spoken += (spoken.empty() ? "" : ", ") + std::string(name) + (name.empty() ? "" : ": ") + text;
     ++row;
   };
   // The identifier has a line of its own, so that each keeps to its side in either direction of writing.
@@ -168,7 +188,7 @@ Gtk::Widget* AlertWindow::detailsOf(const AlertSubject& subject, std::string_vie
   if (subject.applicationID != subject.applicationName) addRow("", isolatedText(subject.applicationID), "alert-detail");
   addRow(words.identity, std::string(isCertain ? words.certain : words.claimed), isCertain ? "alert-certain" : "alert-claimed");
   if (!subject.account.empty()) addRow(words.account, isolatedText(subject.account), "alert-detail");
-  return grid;
+  makePlace(_details, spoken);
 }
 
 }  // namespace palisade

@@ -4,41 +4,19 @@
 
 namespace palisade {
 
-void Arming::focusCame(std::set<Key> held) {
-  _held = std::move(held);
-  setCondition(_isFocused, true);
-}
-
-// Keys that go up elsewhere are not heard of any more.
-void Arming::focusWent() {
-  _held.clear();
-  _pressedKey.reset();
-  setCondition(_isFocused, false);
-}
-
 bool Arming::isArmed() const { return _isVisible && _isFocused && _isUncovered && _now() - _waitingSince >= _wait; }
 
-bool Arming::keyWentDown(Key key) {
-  const bool isFresh = _held.insert(key).second;
-  if (!isFresh) {
-    _pressedKey.reset();
-    startWait();
-    return false;
-  }
-  _pressedKey = key;
-  _keyBegunIn = beginPress();
-  return true;
+Arming::Beginning Arming::beginPress() {
+  if (isArmed()) return _waits;
+  startWait();
+  return std::nullopt;
 }
 
-Arming::Press Arming::keyWentUp(Key key) {
-  _held.erase(key);
-  if (_pressedKey != key) return Press::none;
-  _pressedKey.reset();
-  return endPress(_keyBegunIn);
+Arming::Press Arming::endPress(Beginning beginning) const {
+  return beginning == _waits && isArmed() ? Press::armed : Press::early;
 }
 
-void Arming::pointerWentDown() { _pointerBegunIn = beginPress(); }
-Arming::Press Arming::pointerWentUp() { return endPress(std::exchange(_pointerBegunIn, std::nullopt)); }
+Arming::Press Arming::pointerWentUp() { return endPress(std::exchange(_pointerBegan, std::nullopt)); }
 Arming::Press Arming::pressedAtOnce() { return endPress(beginPress()); }
 
 void Arming::setCondition(bool& condition, bool holds) {
@@ -50,17 +28,6 @@ void Arming::setCondition(bool& condition, bool holds) {
 void Arming::startWait() {
   _waitingSince = _now();
   ++_waits;
-}
-
-// None when it is too early.
-std::optional<unsigned> Arming::beginPress() {
-  if (isArmed()) return _waits;
-  startWait();
-  return std::nullopt;
-}
-
-Arming::Press Arming::endPress(std::optional<unsigned> begunIn) const {
-  return begunIn == _waits && isArmed() ? Press::armed : Press::early;
 }
 
 }  // namespace palisade

@@ -23,11 +23,9 @@ std::string labelled(const std::string& text, char taken, char& chosen) {
 }  // namespace
 
 ButtonLabels buttonLabels(const std::string& refuse, const std::string& allow) {
-  char allowLetter = 0;
-  char refuseLetter = 0;
   ButtonLabels labels;
-  labels.allow = labelled(allow, 0, allowLetter);
-  labels.refuse = labelled(refuse, allowLetter, refuseLetter);
+  labels.allow = labelled(allow, 0, labels.allowLetter);
+  labels.refuse = labelled(refuse, labels.allowLetter, labels.refuseLetter);
   return labels;
 }
 

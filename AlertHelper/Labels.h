@@ -1,6 +1,6 @@
 #pragma once
 
-/// The buttons' labels: their texts with the letter underlined that presses them together with Alt.
+/// The buttons' labels: their texts with the letter underlined that leads the keyboard to them together with Alt.
 ///
 /// Threads: a pure function. Errors: a text without a letter of its own gets none.
 
@@ -11,6 +11,9 @@ namespace palisade {
 struct ButtonLabels {
   std::string refuse;
   std::string allow;
+  /// In lower case; zero for a text without one.
+  char refuseLetter = 0;
+  char allowLetter = 0;
 };
 
 /// The letters differ from each other and are plain Latin ones, which every keyboard can type. "_" stands before the letter;

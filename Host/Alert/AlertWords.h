@@ -14,7 +14,10 @@ struct AlertWords {
   std::string_view account;
   std::string_view identity;
   std::string_view certain;
+  std::string_view likely;
   std::string_view claimed;
+  /// Which keys answer on a terminal.
+  std::string_view keys;
 
   bool isRightToLeft() const { return language == "ar" || language == "he"; }
 };

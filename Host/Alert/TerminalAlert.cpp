@@ -9,10 +9,12 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <initializer_list>
 #include <span>
 #include <string_view>
 #include <utility>
 
+#include "Host/Alert/AlertFocus.h"
 #include "Host/Alert/AskedQuestion.h"
 #include "Host/Alert/Deadline.h"
 #include "Host/Alert/TerminalDialog.h"
@@ -42,9 +44,8 @@ void writeAll(int descriptor, std::string_view text) {
   }
 }
 
-enum class Key { none, selectRefuse, selectAllow, selectOther, press, close };
-
-// Takes the first key off `input`, which is not empty: an escape sequence (ECMA-48) or a byte. One read may bring several.
+// Takes the first key off `input`, which is not empty: an escape sequence (ECMA-48), a key with Alt, which sends an Escape
+// before it, or a byte. One read may bring several.
 std::string_view takeKey(std::string_view& input) {
   std::size_t length = 1;
   if (input.starts_with("\x1bO")) {
@@ -53,28 +54,24 @@ std::string_view takeKey(std::string_view& input) {
     length = 2;
     while (length < input.size() && (input[length] < '@' || input[length] > '~')) ++length;
     length = std::min(input.size(), length + 1);
+  } else if (input.starts_with('\x1b')) {
+    length = std::min<std::size_t>(input.size(), 2);
   }
   const std::string_view key = input.substr(0, length);
   input.remove_prefix(length);
   return key;
 }
 
-// The keys of a two-button dialog. An escape sequence that is not an arrow is no key of ours; a lone Escape closes.
-Key keyOf(std::string_view input) {
-  if (input == "\x1b[D" || input == "\x1bOD") return Key::selectRefuse;
-  if (input == "\x1b[C" || input == "\x1bOC") return Key::selectAllow;
-  if (input == "\t" || input == "\x1b[Z") return Key::selectOther;
-  if (input == "\r" || input == "\n" || input == " ") return Key::press;
-  if (input == "\x1b" || input == "\x03" || input == "\x04") return Key::close;
-  return Key::none;
-}
+bool isOneOf(std::string_view key, std::initializer_list<std::string_view> keys) { return std::ranges::count(keys, key) > 0; }
 
 class TerminalAlertHandle final : public AlertHandle {
  public:
-  TerminalAlertHandle(FileDescriptor terminal, FileDescriptor takenDown, AlertQuestion question)
+  TerminalAlertHandle(FileDescriptor terminal, FileDescriptor takenDown, AlertQuestion question, AlertFocus::Timing timing)
       : _terminal(std::move(terminal)),
         _takenDown(std::move(takenDown)),
-        _question(std::move(question)) {
+        _question(std::move(question)),
+        _focus(Clock::now, timing) {
+    if (!_question.subject) _focus.leaveOutDetails();
     tcgetattr(_terminal.number(), &_earlierSettings);
     termios keys = _earlierSettings;
     cfmakeraw(&keys);
@@ -88,38 +85,51 @@ class TerminalAlertHandle final : public AlertHandle {
 
   void takeDown() const { eventfd_write(_takenDown.number(), 1); }
 
-  AlertResponse waitForAnswer(std::chrono::milliseconds armedAfter, Deadline deadline) {
-    Clock::time_point armedAt = Clock::now() + armedAfter;
+  AlertResponse waitForAnswer(Deadline deadline) {
     char buffer[64];
     while (true) {
       const std::size_t length = readKeys(buffer, deadline);
       if (length == 0) return AlertResponseNobody;
-      for (std::string_view input(buffer, length); !input.empty();) {
-        switch (keyOf(takeKey(input))) {
-          case Key::close: return AlertResponseNobody;
-          case Key::selectRefuse: select(DialogButton::refuse); break;
-          case Key::selectAllow: select(DialogButton::allow); break;
-          case Key::selectOther: select(_selected == DialogButton::refuse ? DialogButton::allow : DialogButton::refuse); break;
-          case Key::press:
-            if (_selected == DialogButton::refuse) return AlertResponseAlternateButton;
-            if (Clock::now() >= armedAt) return AlertResponseDefaultButton;
-            armedAt = Clock::now() + armedAfter;
-            break;
-          case Key::none: break;
-        }
+      std::string_view input(buffer, length);
+      for (bool isAlone = true; !input.empty(); isAlone = false) {
+        const std::string_view key = takeKey(input);
+        if (isOneOf(key, {"\x1b", "\x03", "\x04"})) return AlertResponseNobody;
+        const auto button = heed(key);
+        // What comes in one piece with other keys was pasted, or typed ahead of this program.
+        if (!button || !isAlone || !input.empty()) continue;
+        return *button == AlertPlace::allow ? AlertResponseDefaultButton : AlertResponseAlternateButton;
       }
+      drawAgain();
     }
   }
 
  private:
+  // The button that the key presses, if it presses one.
+  std::optional<AlertPlace> heed(std::string_view key) {
+    if (isOneOf(key, {"\r", "\n", " "})) return _focus.press();
+    if (key == "\t") {
+      _focus.stepForward();
+    } else if (key == "\x1b[Z") {
+      _focus.stepBack();
+    } else if (isOneOf(key, {"\x1b[D", "\x1bOD"})) {
+      _focus.crossTo(AlertPlace::refuse);
+    } else if (isOneOf(key, {"\x1b[C", "\x1bOC"})) {
+      _focus.crossTo(AlertPlace::allow);
+    } else {
+      _focus.typed();
+    }
+    return std::nullopt;
+  }
+
   void draw() {
-    const std::string dialog = drawDialog(_question, _selected, columnsOfTerminal(_terminal.number()));
+    _drawn = _focus.place();
+    const std::string dialog = drawDialog(_question, _drawn, columnsOfTerminal(_terminal.number()));
     _drawnLines = static_cast<std::size_t>(std::ranges::count(dialog, '\n'));
     writeAll(_terminal.number(), dialog);
   }
 
-  void select(DialogButton button) {
-    _selected = button;
+  void drawAgain() {
+    if (_focus.place() == _drawn) return;
     writeAll(_terminal.number(), "\x1b[" + std::to_string(_drawnLines) + "A\r\x1b[J");
     draw();
   }
@@ -143,7 +153,8 @@ class TerminalAlertHandle final : public AlertHandle {
   FileDescriptor _takenDown;
   AlertQuestion _question;
   termios _earlierSettings{};
-  DialogButton _selected = DialogButton::allow;
+  AlertFocus _focus;
+  AlertPlace _drawn = AlertPlace::text;
   std::size_t _drawnLines = 0;
 };
 
@@ -164,14 +175,15 @@ std::shared_ptr<AlertHandle> TerminalAlert::createAlert(AlertAllocator, double, 
     return nullptr;
   }
   return std::make_shared<TerminalAlertHandle>(std::move(terminal), std::move(takenDown),
-                                               askedQuestion(description, _options.subject(), _options.languages()));
+                                               askedQuestion(description, _options.subject(), _options.languages()),
+                                               _options.timing);
 }
 
 int TerminalAlert::receiveResponse(const std::shared_ptr<AlertHandle>& handle, double timeoutSeconds, AlertResponse& response) {
   response = AlertResponseNobody;
   const auto alert = own(handle);
   if (alert == nullptr) return EINVAL;
-  response = alert->waitForAnswer(_options.armedAfter, deadlineAfter(timeoutSeconds));
+  response = alert->waitForAnswer(deadlineAfter(timeoutSeconds));
   return 0;
 }
 

@@ -6,14 +6,14 @@
 /// any other. Two alerts on one terminal would overwrite each other: whoever schedules alerts shows one at a time. Ownership: a
 /// handle owns its connection to the terminal and restores the terminal's settings when it goes away. Errors: without a
 /// terminal no alert is created and the answer is nobody's. A terminal that hangs up, an interrupt and Escape are nobody's
-/// answer too. Only the allow button, pressed when the alert has been visible for half a second, is consent: what was typed
-/// before, or too soon, presses nothing and starts the half second again.
+/// answer too. A button is pressed by Return or Space alone, half a second after the selection came to it (see `AlertFocus`):
+/// what people type while the alert comes answers nothing. What was typed before is thrown away.
 
-#include <chrono>
 #include <functional>
 #include <optional>
 #include <string>
 
+#include "Host/Alert/AlertFocus.h"
 #include "Host/Alert/AlertQuestion.h"
 #include "Platform/SystemAlert.h"
 
@@ -28,7 +28,7 @@ class TerminalAlert final : public SystemAlert {
     std::function<std::optional<AlertSubject>()> subject = [] { return std::nullopt; };
     /// Catalogue names, best first, separated by colons; called in `createAlert`.
     std::function<std::string()> languages = [] { return std::string("en"); };
-    std::chrono::milliseconds armedAfter{500};
+    AlertFocus::Timing timing = {};
   };
 
   explicit TerminalAlert(Options options) : _options(std::move(options)) {}

@@ -13,6 +13,7 @@ constexpr std::size_t narrowest = 30;
 constexpr std::size_t columnGap = 2;
 constexpr std::string_view bold = "\x1b[1m";
 constexpr std::string_view reverse = "\x1b[7m";
+constexpr std::string_view faint = "\x1b[2m";
 constexpr std::string_view plain = "\x1b[0m";
 
 std::string repeated(std::string_view text, std::size_t times) {
@@ -33,6 +34,9 @@ class Frame {
 
   void addEmptyLine() { addLine("", 0); }
 
+  /// Whether the lines from here on are selected.
+  void select(bool isSelected) { _edge = isSelected ? std::string(reverse) + " " + std::string(plain) : " "; }
+
   void addText(std::string_view text, std::string_view style = "") { addRow("", 0, text, style); }
 
   // Text beside a label that takes `labelColumns` columns.
@@ -45,15 +49,15 @@ class Frame {
     }
   }
 
-  void addButtons(std::string_view first, std::string_view second, DialogButton selected) {
+  void addButtons(std::string_view first, std::string_view second, AlertPlace selected) {
     const std::string one = "[ " + harmless(first) + " ]";
     const std::string other = "[ " + harmless(second) + " ]";
     const auto shown = [](const std::string& button, bool isSelected) {
       return isSelected ? std::string(reverse) + button + std::string(plain) : button;
     };
-    addLine(shown(one, selected == DialogButton::refuse) + std::string(columnGap, ' ') +
-                shown(other, selected == DialogButton::allow),
-            columnsOf(one) + columnGap + columnsOf(other));
+    addLine(
+        shown(one, selected == AlertPlace::refuse) + std::string(columnGap, ' ') + shown(other, selected == AlertPlace::allow),
+        columnsOf(one) + columnGap + columnsOf(other));
   }
 
   std::string finished() {
@@ -69,10 +73,11 @@ class Frame {
   // `shown` takes `columns` columns on the screen, whatever escape sequences it holds.
   void addLine(std::string_view shown, std::size_t columns) {
     const std::size_t padding = _inner > columns ? _inner - columns : 0;
-    _lines.append("│ ").append(shown).append(padding, ' ').append(" │\r\n");
+    _lines.append("│").append(_edge).append(shown).append(padding, ' ').append(" │\r\n");
   }
 
   std::size_t _inner;
+  std::string _edge = " ";
   std::string _lines;
 };
 
@@ -88,17 +93,23 @@ void addSubject(Frame& frame, const AlertSubject& subject, const AlertWords& wor
 
 }  // namespace
 
-std::string drawDialog(const AlertQuestion& question, DialogButton selected, std::size_t columns) {
+std::string drawDialog(const AlertQuestion& question, AlertPlace selected, std::size_t columns) {
+  const AlertWords& words = alertWordsFor(question.languages);
   Frame frame(columns);
+  frame.select(selected == AlertPlace::text);
   frame.addText(question.title, bold);
   frame.addEmptyLine();
   frame.addText(question.message);
+  frame.select(false);
   frame.addEmptyLine();
   if (question.subject) {
-    addSubject(frame, *question.subject, alertWordsFor(question.languages));
+    frame.select(selected == AlertPlace::details);
+    addSubject(frame, *question.subject, words);
+    frame.select(false);
     frame.addEmptyLine();
   }
   frame.addButtons(question.refuseTitle, question.allowTitle, selected);
+  frame.addText(words.keys, faint);
   return frame.finished();
 }
 

@@ -1,4 +1,4 @@
-// When a press is meant, on a clock that the test turns: a table of early and late presses, and storms of clicks and keys.
+// When a press is meant, on a clock that the test turns: a table of early and late presses, and storms of clicks.
 
 #include "AlertHelper/Arming.h"
 
@@ -10,21 +10,13 @@ namespace {
 using std::chrono::milliseconds;
 using Press = Arming::Press;
 
-constexpr Arming::Key enter = 36;
-constexpr Arming::Key space = 65;
-
 class AnAlertThatArms : public testing::Test {
  protected:
-  void appear(std::set<Arming::Key> held = {}) {
+  void appear() {
     _arming.setVisible(true);
-    _arming.focusCame(std::move(held));
+    _arming.setFocused(true);
   }
   void pass(int time) { _now += milliseconds(time); }
-  Press key(Arming::Key code = enter, int heldFor = 0) {
-    _arming.keyWentDown(code);
-    pass(heldFor);
-    return _arming.keyWentUp(code);
-  }
   Press click(int heldFor = 0) {
     _arming.pointerWentDown();
     pass(heldFor);
@@ -37,20 +29,13 @@ class AnAlertThatArms : public testing::Test {
 
 TEST_F(AnAlertThatArms, TakesOnePressAtAnyTimeOnlyFromHalfASecondOn) {
   for (int time = 0; time <= 2000; ++time) {
-    for (const bool withKey : {false, true}) {
-      Arming::Moment now{};
-      Arming arming([&now] { return now; });
-      arming.setVisible(true);
-      arming.focusCame({});
-      now += milliseconds(time);
-      if (withKey) {
-        arming.keyWentDown(enter);
-      } else {
-        arming.pointerWentDown();
-      }
-      const Press press = withKey ? arming.keyWentUp(enter) : arming.pointerWentUp();
-      ASSERT_EQ(press, time >= 500 ? Press::armed : Press::early) << time << " ms";
-    }
+    Arming::Moment now{};
+    Arming arming([&now] { return now; });
+    arming.setVisible(true);
+    arming.setFocused(true);
+    now += milliseconds(time);
+    arming.pointerWentDown();
+    ASSERT_EQ(arming.pointerWentUp(), time >= 500 ? Press::armed : Press::early) << time << " ms";
   }
 }
 
@@ -59,69 +44,30 @@ TEST_F(AnAlertThatArms, TakesNoneOfAStormOfPresses) {
     appear();
     for (int time = 0; time <= 2000; time += pause) {
       EXPECT_EQ(click(), Press::early) << "every " << pause << " ms";
-      EXPECT_EQ(key(), Press::early) << "every " << pause << " ms";
       EXPECT_EQ(_arming.pressedAtOnce(), Press::early) << "every " << pause << " ms";
       pass(pause);
     }
     pass(500);
     EXPECT_EQ(click(), Press::armed);
-    _arming.focusWent();
+    _arming.setFocused(false);
   }
 }
 
 TEST_F(AnAlertThatArms, TakesNoPressThatBeganBefore) {
   appear();
   EXPECT_EQ(click(600), Press::early);
-  _arming.focusWent();
-  appear();
-  EXPECT_EQ(key(enter, 600), Press::early);
 }
 
 TEST_F(AnAlertThatArms, TakesAPressThatLastsLong) {
   appear();
   pass(500);
   EXPECT_EQ(click(3000), Press::armed);
-  EXPECT_EQ(key(enter, 3000), Press::armed);
 }
 
-TEST_F(AnAlertThatArms, TakesNoKeyThatRepeatsByItself) {
+TEST_F(AnAlertThatArms, TakesNoPressThatOnlyEnds) {
   appear();
-  pass(500);
-  EXPECT_TRUE(_arming.keyWentDown(enter));
-  for (int count = 0; count < 60; ++count) {
-    pass(33);
-    EXPECT_FALSE(_arming.keyWentDown(enter));
-  }
-  EXPECT_EQ(_arming.keyWentUp(enter), Press::none);
-  EXPECT_EQ(key(), Press::early) << "the wait began again with the last repetition";
-  pass(500);
-  EXPECT_EQ(key(), Press::armed);
-}
-
-TEST_F(AnAlertThatArms, TakesNoKeyThatWasDownBefore) {
-  appear({enter});
-  pass(660);
-  EXPECT_FALSE(_arming.keyWentDown(enter));
-  EXPECT_EQ(_arming.keyWentUp(enter), Press::none);
-  pass(500);
-  EXPECT_EQ(key(), Press::armed);
-}
-
-TEST_F(AnAlertThatArms, TakesNoKeyThatOnlyGoesUp) {
-  appear({enter});
   pass(600);
-  EXPECT_EQ(_arming.keyWentUp(enter), Press::none);
-  EXPECT_EQ(_arming.keyWentUp(space), Press::none);
   EXPECT_EQ(_arming.pointerWentUp(), Press::early);
-}
-
-TEST_F(AnAlertThatArms, TakesOnlyTheLastOfTwoKeysThatAreDown) {
-  appear();
-  pass(500);
-  _arming.keyWentDown(enter);
-  _arming.keyWentDown(space);
-  EXPECT_EQ(_arming.keyWentUp(enter), Press::none);
-  EXPECT_EQ(_arming.keyWentUp(space), Press::armed);
 }
 
 TEST_F(AnAlertThatArms, WaitsAgainWhenItWasHiddenCoveredOrLeft) {
@@ -136,8 +82,8 @@ TEST_F(AnAlertThatArms, WaitsAgainWhenItWasHiddenCoveredOrLeft) {
                                                                                       _arming.setCovered(false);
                                                                                     }},
                                                                                    {"left", [&] {
-                                                                                      _arming.focusWent();
-                                                                                      _arming.focusCame({});
+                                                                                      _arming.setFocused(false);
+                                                                                      _arming.setFocused(true);
                                                                                     }}};
   appear();
   for (const auto& [name, disturb] : disturbances) {
@@ -158,7 +104,7 @@ TEST_F(AnAlertThatArms, StaysUnarmedAsLongAsAnythingIsMissing) {
   _arming.setVisible(true);
   pass(5000);
   EXPECT_EQ(click(), Press::early) << "never focused";
-  _arming.focusCame({});
+  _arming.setFocused(true);
   _arming.setCovered(true);
   pass(5000);
   EXPECT_EQ(click(), Press::early) << "covered";

@@ -1,4 +1,4 @@
-// The letters that press the buttons.
+// The letters that lead to the buttons.
 
 #include "AlertHelper/Labels.h"
 
@@ -10,14 +10,18 @@ namespace {
 TEST(ButtonLabels, UnderlineALetterEach) {
   struct Row {
     const char *refuse, *allow, *refuseLabel, *allowLabel;
+    char refuseLetter, allowLetter;
   };
-  for (const Row& row : {Row{"Don’t Allow", "Allow", "_Don’t Allow", "_Allow"},
-                         Row{"Nicht erlauben", "Erlauben", "_Nicht erlauben", "_Erlauben"},
-                         Row{"Ablehnen", "Annehmen", "A_blehnen", "_Annehmen"}, Row{"許可しない", "許可", "許可しない", "許可"},
-                         Row{"a_a", "a", "a__a", "_a"}, Row{"", "", "", ""}}) {
+  for (const Row& row :
+       {Row{"Don’t Allow", "Allow", "_Don’t Allow", "_Allow", 'd', 'a'},
+        Row{"Nicht erlauben", "Erlauben", "_Nicht erlauben", "_Erlauben", 'n', 'e'},
+        Row{"Ablehnen", "Annehmen", "A_blehnen", "_Annehmen", 'b', 'a'}, Row{"許可しない", "許可", "許可しない", "許可", 0, 0},
+        Row{"a_a", "a", "a__a", "_a", 0, 'a'}, Row{"", "", "", "", 0, 0}}) {
     const ButtonLabels labels = buttonLabels(row.refuse, row.allow);
     EXPECT_EQ(labels.refuse, row.refuseLabel);
     EXPECT_EQ(labels.allow, row.allowLabel);
+    EXPECT_EQ(labels.refuseLetter, row.refuseLetter);
+    EXPECT_EQ(labels.allowLetter, row.allowLetter);
   }
 }
 

@@ -21,8 +21,11 @@ until_window() { local try; for try in $(seq 400); do window && return; sleep 0.
 # A second is twenty looks.
 gone() { local try; for try in $(seq 20); do window || { echo "gone"; return; }; sleep 0.05; done; echo "still there"; }
 request() { photos request --app 1234567890 --permission email; }
-# One key at a time, with pauses in which the window can arm itself.
-press() { local try; for try in $(seq 20); do xdotool key "$1"; sleep 0.8; window || return 0; done; }
+# Leads the keyboard that many steps on, and presses there when it has stood there for long enough.
+press_after() {
+  xdotool key $(for step in $(seq "$1"); do echo Tab; done)
+  local try; for try in $(seq 20); do sleep 0.8; window || return 0; xdotool key Return; done
+}
 """
 
 
@@ -39,14 +42,14 @@ def session(script, alert="desktop", window="palisade-alert"):
 
 class AnApplicationThatAsks(unittest.TestCase):
     def test_is_granted_access_by_the_allow_button(self):
-        output = session('palisade doctor; request & asking=$!; until_window; press Return; wait $asking; echo "status $?"; '
+        output = session('palisade doctor; request & asking=$!; until_window; press_after 3; wait $asking; echo "status $?"; '
                          "palisade grants; kill $daemon")
         self.assertRegex(output, r"(?i)alert.*desktop")
         self.assertIn("status 0", output)
         self.assertIn("org.example.photos", output)
 
     def test_is_refused_by_the_other_button_and_not_asked_about_again(self):
-        output = session('request & asking=$!; until_window; xdotool key Tab Return; wait $asking; echo "first $?"; '
+        output = session('request & asking=$!; until_window; press_after 2; wait $asking; echo "first $?"; '
                          'request; echo "second $?"; kill $daemon')
         self.assertIn("first 1", output)
         self.assertIn("second 1", output)

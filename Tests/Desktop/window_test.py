@@ -26,6 +26,10 @@ from alert import ALLOWED, CLOSED, EXAMPLE, REFUSED, Alert  # noqa: E402
 HELPER = sys.argv.pop(1)
 PATIENCE = 20
 ARMED_AFTER = 0.5
+# Nothing moves the keyboard for that long after typing.
+UNMOVED_FOR = 3
+# How many steps lead from the text to a button.
+TO_REFUSE, TO_ALLOW = 2, 3
 
 
 def until(condition, what):
@@ -56,6 +60,20 @@ def widget(process, name):
             for node in descendants(application):
                 if node.get_name() == name and node.get_role_name() == "push button":
                     return node
+    except gi.repository.GLib.Error:
+        pass
+    return None
+
+
+def focused(process):
+    """The accessible name of what has the keyboard's focus in the helper with this process number, or None."""
+    try:
+        for application in descendants_of_desktop():
+            if application.get_process_id() != process:
+                continue
+            for node in descendants(application):
+                if node.get_state_set().contains(Atspi.StateType.FOCUSED):
+                    return node.get_name()
     except gi.repository.GLib.Error:
         pass
     return None
@@ -98,6 +116,11 @@ class AWindow(unittest.TestCase):
                 continue
         raise AssertionError("no press was taken")
 
+    def choose(self, steps):
+        """Moves the keyboard on from the text, and waits until a key may press what it comes to."""
+        xdotool("key", *["Tab"] * steps)
+        time.sleep(ARMED_AFTER + 0.2)
+
     def middle_of(self, button):
         place = button.get_extents(Atspi.CoordType.SCREEN)
         return place.x + place.width // 2, place.y + place.height // 2
@@ -113,18 +136,41 @@ class AWindow(unittest.TestCase):
         Atspi.Action.do_action(widget(alert.process.pid, EXAMPLE["refuse"]), 0)
         self.assertEqual(alert.wait(), REFUSED)
 
-    def test_is_allowed_by_return(self):
-        alert = self.ask()
-        self.assertEqual(self.press_until_answered(alert, lambda: xdotool("key", "Return")), ALLOWED)
+    def test_is_allowed_by_return_and_by_space_on_the_button(self):
+        for key in ("Return", "KP_Enter", "space"):
+            alert = self.ask()
+            self.choose(TO_ALLOW)
+            xdotool("key", key)
+            self.assertEqual(alert.wait(), ALLOWED, key)
 
-    def test_is_refused_by_return_after_tab(self):
-        alert = self.ask()
-        xdotool("key", "Tab", "Return")
-        self.assertEqual(alert.wait(), REFUSED)
+    def test_is_refused_by_return_and_by_space_on_the_button(self):
+        for key in ("Return", "KP_Enter", "space"):
+            alert = self.ask()
+            self.choose(TO_REFUSE)
+            xdotool("key", key)
+            self.assertEqual(alert.wait(), REFUSED, key)
 
-    def test_is_allowed_by_its_letter(self):
+    def test_leads_the_keyboard_to_its_buttons_by_their_letters(self):
+        for letter, steps, word in (("alt+a", TO_ALLOW, ALLOWED), ("alt+d", TO_REFUSE, REFUSED)):
+            alert = self.ask()
+            xdotool("key", *[letter] * steps)
+            self.assert_unanswered(alert, ARMED_AFTER + 0.2)
+            xdotool("key", "Return")
+            self.assertEqual(alert.wait(), word)
+
+    def test_leads_the_keyboard_between_its_buttons_by_arrows(self):
+        for keys, word in ((["Right"], ALLOWED), (["Right", "Left"], REFUSED), (["Tab", "shift+Tab"], REFUSED)):
+            alert = self.ask()
+            xdotool("key", *["Tab"] * TO_REFUSE, *keys)
+            self.assert_unanswered(alert, ARMED_AFTER + 0.2)
+            xdotool("key", "Return")
+            self.assertEqual(alert.wait(), word)
+
+    def test_shows_where_the_keyboard_stands(self):
         alert = self.ask()
-        self.assertEqual(self.press_until_answered(alert, lambda: xdotool("key", "alt+a")), ALLOWED)
+        for place in ("would like to use", "org.example.photos", "Don’t Allow", "Allow", "would like to use"):
+            until(lambda place=place: place in (focused(alert.process.pid) or ""), place)
+            xdotool("key", "Tab")
 
     def test_is_allowed_by_a_click(self):
         alert = self.ask()
@@ -152,9 +198,33 @@ class AWindow(unittest.TestCase):
 
     def test_takes_none_of_a_storm_of_keys(self):
         alert = self.ask()
-        xdotool("key", "--delay", 40, *["Return"] * 50)
-        self.assert_unanswered(alert, 0.1)
-        self.assertEqual(self.press_until_answered(alert, lambda: xdotool("key", "Return")), ALLOWED)
+        xdotool("key", "--delay", 40, *["Tab"] * TO_ALLOW, *["Return"] * 50)
+        self.assert_unanswered(alert, ARMED_AFTER + 0.2)
+        xdotool("key", "Return")
+        self.assertEqual(alert.wait(), ALLOWED)
+
+    def test_takes_no_key_at_its_text_and_its_details(self):
+        alert = self.ask()
+        for _ in range(2):
+            for key in ("Return", "space", "alt+Return", "ctrl+Return"):
+                self.assert_unanswered(alert, ARMED_AFTER + 0.2)
+                xdotool("key", key)
+            self.assert_unanswered(alert, UNMOVED_FOR + 0.2)
+            xdotool("key", "Tab")
+
+    def test_takes_every_other_key_for_typing(self):
+        alert = self.ask()
+        for key in ("x", "Up", "Page_Down", "alt+x", "ctrl+c", "F1"):
+            self.choose(TO_ALLOW)
+            xdotool("key", key, "Return")
+            self.assert_unanswered(alert, ARMED_AFTER + 0.2)
+            xdotool("key", *["Tab"] * TO_ALLOW)
+            self.assert_unanswered(alert, ARMED_AFTER + 0.2)
+            xdotool("key", "Return")
+            self.assert_unanswered(alert, UNMOVED_FOR + 0.2)
+        self.choose(TO_ALLOW)
+        xdotool("key", "Return")
+        self.assertEqual(alert.wait(), ALLOWED)
 
     def test_takes_no_key_that_was_down_before(self):
         xdotool("keydown", "Return")
@@ -163,11 +233,14 @@ class AWindow(unittest.TestCase):
             self.assert_unanswered(alert, 2)
         finally:
             xdotool("keyup", "Return")
-        self.assert_unanswered(alert, 0.3)
-        self.assertEqual(self.press_until_answered(alert, lambda: xdotool("key", "Return")), ALLOWED)
+        self.assert_unanswered(alert, UNMOVED_FOR + 0.2)
+        self.choose(TO_ALLOW)
+        xdotool("key", "Return")
+        self.assertEqual(alert.wait(), ALLOWED)
 
     def test_takes_no_key_that_is_held(self):
         alert = self.ask()
+        self.choose(TO_ALLOW)
         xdotool("keydown", "Return")
         try:
             self.assert_unanswered(alert, 2)

@@ -104,7 +104,6 @@ class AnApplicationThatIsRefused(AnApplication):
         for process in waiting:
             self.assertIn("The user is being asked", process.stdout.readline().decode())
         self.session.person.answer = "refuse"
-        self.session.person.press(b"\t\r")
         endings = collections.Counter(process.communicate(timeout=20)[0].decode().partition(".")[0] for process in waiting)
         self.assertEqual(endings, {"Access is refused": MOST_REFUSALS, "Nobody was asked": 6 - MOST_REFUSALS})
 

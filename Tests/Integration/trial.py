@@ -5,7 +5,6 @@ import json
 import os
 import pathlib
 import pty
-import re
 import select
 import shutil
 import signal
@@ -21,6 +20,9 @@ from accounts import NAME, Caller
 from bus_wire import MEMBER, PATIENCE, BusError, socket_of
 
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
+sys.path.insert(0, str(PROJECT / "Tools/Trial"))
+from alert_screen import CLOSE, PRESS, READY_AFTER, STEP, AlertScreen, selected_button  # noqa: E402
+
 BUILD = PROJECT / "build/debug"
 DAEMONS = ("accountd", "vantad")
 # The program that this is: what the daemon takes a caller in this process for.
@@ -69,13 +71,11 @@ def wait_until(is_true, what: str, timeout: float = PATIENCE):
 class Person:
     """Sits at a terminal of their own and answers what the daemon asks there."""
 
-    KEYS = {"allow": b"\r", "refuse": b"\t\r", "close": b"\x1b", "nothing": b""}
-    # An alert takes no consent before it has stood for half a second.
-    READING_TIME = 0.55
-
     def __init__(self, answer: str):
+        # "allow", "refuse", "close" or "nothing"; may change while an alert stands.
         self.answer = answer
         self.alerts = 0
+        self._selected = None
         self._changed = threading.Condition()
         self._screen, self._terminal = pty.openpty()
         settings = termios.tcgetattr(self._terminal)
@@ -101,31 +101,34 @@ class Person:
         os.write(self._screen, keys)
 
     def _watch(self) -> None:
-        seen = ""
+        seen = AlertScreen()
         while True:
-            # An alert that stands on has not taken the key: it came too early.
-            readable, _, _ = select.select([self._screen, self._leave], [], [], self.READING_TIME if self._hesitates() else None)
+            readable, _, _ = select.select([self._screen, self._leave], [], [], READY_AFTER if self._alert_stands() else None)
             if self._leave in readable:
                 return
             if not readable:
-                self.press(self.KEYS[self.answer])
+                # An alert that stands on has not taken the key: it came too early.
+                if self.answer in ("allow", "refuse"):
+                    self.press(PRESS if self._selected == self.answer else STEP)
+                    self._selected = None
                 continue
-            seen += os.read(self._screen, 1 << 16).decode(errors="replace")
-            # A dialog that is drawn again, for another button, begins without the empty line.
-            while (whole := re.search(r"\r\n(?:\x1b\[[0-9;]*[A-Za-z])*┌.*?┘", seen, re.DOTALL)):
-                seen = seen[whole.end():]
-                self._meet_alert()
+            for dialog, is_new in seen.read(os.read(self._screen, 1 << 16).decode(errors="replace")):
+                self._selected = selected_button(dialog)
+                if is_new:
+                    self._meet_alert()
+                if self.answer in ("allow", "refuse") and self._selected != self.answer:
+                    self.press(STEP)
 
     def _meet_alert(self) -> None:
         with self._changed:
             self.alerts += 1
             self._changed.notify_all()
-        if self.answer != "allow":
-            self.press(self.KEYS[self.answer])
+        if self.answer == "close":
+            self.press(CLOSE)
 
-    def _hesitates(self) -> bool:
-        """Whether there is an alert to allow: while one stands, the terminal gives key by key."""
-        return self.answer == "allow" and not termios.tcgetattr(self._terminal)[3] & termios.ICANON
+    def _alert_stands(self) -> bool:
+        """While one stands, the terminal gives key by key."""
+        return not termios.tcgetattr(self._terminal)[3] & termios.ICANON
 
 
 class Trial:

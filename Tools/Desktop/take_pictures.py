@@ -73,7 +73,7 @@ def picture_of_terminal(name, language):
     command = f"'{PROJECT}/Tools/Trial/session' '{BUILD}' 2>/dev/null"
     look = ["-fa", "DejaVu Sans Mono", "-fd", "Noto Sans Mono CJK JP", "-fs", "11", "-bg", "white", "-fg", "black", "-xrm",
             "XTerm*forceBoxChars: true"]
-    xterm = ["xterm", "-u8", *look, "-geometry", "84x18", "-T", "Terminal", "-e", "bash", "-c", command]
+    xterm = ["xterm", "-u8", *look, "-geometry", "84x19", "-T", "Terminal", "-e", "bash", "-c", command]
     with subprocess.Popen(xterm, env=os.environ | {"LANGUAGE": language}, stderr=subprocess.DEVNULL) as terminal:
         window = window_of(terminal.pid)
         time.sleep(6)

@@ -17,7 +17,7 @@ constexpr std::string_view help = R"(Usage: palisade-story [--answer allow|refus
 
 Loads a plug-in module and carries a request for access through it, from the client's options to the stored grant.
 
-With a terminal the question comes to you: the arrow keys choose a button, Return presses it, Escape closes the alert.
+With a terminal the question comes to you: Tab chooses a button, Return presses it, Escape closes the alert.
 Without one, or with --answer, the program announces an answer and gives it.
 
 MODULE is the plug-in beside this program when it is left out.

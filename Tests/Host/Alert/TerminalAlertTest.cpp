@@ -1,5 +1,5 @@
-// The terminal's alert, on a real pseudo-terminal: only the allow button, pressed when the alert has stood long enough, is
-// consent.
+// The terminal's alert, on a real pseudo-terminal: only the allow button, pressed when the selection has stood there for long
+// enough, is consent.
 
 #include "Host/Alert/TerminalAlert.h"
 
@@ -18,11 +18,11 @@ namespace palisade {
 namespace {
 
 using std::chrono::hours;
-using std::chrono::milliseconds;
 using testing::AllOf;
 using testing::HasSubstr;
 
 constexpr AlertResponse nobody = AlertResponseNobody;
+constexpr AlertFocus::Timing atOnce{.wait = {}, .quiet = {}};
 
 class ATerminalAlert : public testing::Test {
  protected:
@@ -38,9 +38,10 @@ class ATerminalAlert : public testing::Test {
     if (_screen >= 0) close(_screen);
   }
 
-  // Shows an alert, waits until it stands on the screen, types `keys` one after another and answers what became of it.
-  AlertResponse answerAfter(std::initializer_list<std::string> keys, milliseconds armedAfter = milliseconds(0)) {
-    TerminalAlert alert({.terminal = _terminal, .armedAfter = armedAfter});
+  // Shows an alert, waits until it stands on the screen, types `keys` one after another and answers what became of it. A key
+  // that moves the selection has the dialog drawn again.
+  AlertResponse answerAfter(std::initializer_list<std::string> keys, const AlertFocus::Timing& timing = atOnce) {
+    TerminalAlert alert({.terminal = _terminal, .subject = photos, .timing = timing});
     const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
     readUntil("┘");
     auto answer = std::async(std::launch::async, [&] {
@@ -50,10 +51,13 @@ class ATerminalAlert : public testing::Test {
     });
     for (const std::string& key : keys) {
       type(key);
-      // A key that moves the selection draws the dialog again.
       if (key == "\t" || key.starts_with("\x1b[")) readUntil("┘");
     }
     return answer.get();
+  }
+
+  static std::optional<AlertSubject> photos() {
+    return AlertSubject{.applicationName = "Photos", .applicationID = "org.example.photos"};
   }
 
   void type(const std::string& key) { ASSERT_EQ(write(_screen, key.data(), key.size()), static_cast<ssize_t>(key.size())); }
@@ -71,18 +75,37 @@ class ATerminalAlert : public testing::Test {
   int _screen = -1;
 };
 
-TEST_F(ATerminalAlert, IsAnsweredByTheDefaultButtonWithReturn) { EXPECT_EQ(answerAfter({"\r"}), AlertResponseDefaultButton); }
-
-TEST_F(ATerminalAlert, IsAnsweredByTheAlternateButtonAfterTab) {
-  EXPECT_EQ(answerAfter({"\t", "\r"}), AlertResponseAlternateButton);
+TEST_F(ATerminalAlert, IsAnsweredByTheDefaultButtonWhenItIsSelected) {
+  for (const char* press : {"\r", "\n", " "}) EXPECT_EQ(answerAfter({"\t", "\t", "\t", press}), AlertResponseDefaultButton);
 }
 
-TEST_F(ATerminalAlert, IsAnsweredByTheAlternateButtonAfterTheLeftArrow) {
-  EXPECT_EQ(answerAfter({"\x1b[D", " "}), AlertResponseAlternateButton);
+TEST_F(ATerminalAlert, IsAnsweredByTheAlternateButtonWhenItIsSelected) {
+  for (const char* press : {"\r", "\n", " "}) EXPECT_EQ(answerAfter({"\t", "\t", press}), AlertResponseAlternateButton);
 }
 
-TEST_F(ATerminalAlert, ReturnsToTheDefaultButtonWithTheRightArrow) {
-  EXPECT_EQ(answerAfter({"\x1b[D", "\x1b[C", "\r"}), AlertResponseDefaultButton);
+TEST_F(ATerminalAlert, HasItsSelectionMovedBetweenItsButtonsByArrows) {
+  EXPECT_EQ(answerAfter({"\t", "\t", "\x1b[C", "\r"}), AlertResponseDefaultButton);
+  EXPECT_EQ(answerAfter({"\t", "\t", "\x1b[C", "\x1b[D", "\r"}), AlertResponseAlternateButton);
+  EXPECT_EQ(answerAfter({"\t", "\t", "\t", "\x1b[Z", "\r"}), AlertResponseAlternateButton);
+}
+
+TEST_F(ATerminalAlert, IsNotAnsweredAtItsTextAndItsDetails) {
+  EXPECT_EQ(answerAfter({"\r", " ", "\x1b"}), nobody);
+  EXPECT_EQ(answerAfter({"\t", "\r", "\x1b"}), nobody);
+}
+
+TEST_F(ATerminalAlert, TakesKeysWithAltForTyping) {
+  EXPECT_EQ(answerAfter({"\x1b"
+                         "a",
+                         "\x1b"
+                         "d",
+                         "\r", "\x03"}),
+            nobody);
+}
+
+TEST_F(ATerminalAlert, TakesWhatComesInOnePieceForTyping) {
+  EXPECT_EQ(answerAfter({"\t\t\t\r", "\x03"}), nobody);
+  EXPECT_EQ(answerAfter({"\t", "\t", "\t", "\rls\r", "\x03"}), nobody);
 }
 
 TEST_F(ATerminalAlert, TakesEscapeInterruptAndEndOfFileForNobodysAnswer) {
@@ -90,10 +113,7 @@ TEST_F(ATerminalAlert, TakesEscapeInterruptAndEndOfFileForNobodysAnswer) {
 }
 
 TEST_F(ATerminalAlert, SaysWhoAsksInTheUsersLanguage) {
-  TerminalAlert alert(
-      {.terminal = _terminal,
-       .subject = [] { return AlertSubject{.applicationName = "Photos", .applicationID = "org.example.photos"}; },
-       .languages = [] { return "de"; }});
+  TerminalAlert alert({.terminal = _terminal, .subject = photos, .languages = [] { return "de"; }});
   const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
   EXPECT_THAT(readUntil("┘"),
               AllOf(HasSubstr("Anwendung  Photos"), HasSubstr("org.example.photos"), HasSubstr("Nur behauptet")));
@@ -101,8 +121,11 @@ TEST_F(ATerminalAlert, SaysWhoAsksInTheUsersLanguage) {
 
 TEST_F(ATerminalAlert, IgnoresKeysThatMeanNothing) { EXPECT_EQ(answerAfter({"y", "\x1b"}), nobody); }
 
-TEST_F(ATerminalAlert, AllowsNothingBeforeItHasStoodLongEnough) {
-  EXPECT_EQ(answerAfter({"\r", "\t", "\r"}, hours(1)), AlertResponseAlternateButton);
+TEST_F(ATerminalAlert, AnswersNothingBeforeItsSelectionHasStoodLongEnough) {
+  for (const auto& keys :
+       {std::initializer_list<std::string>{"\t", "\t", "\r", "\r", "\x03"}, {"\t", "\t", "\t", " ", "\x03"}}) {
+    EXPECT_EQ(answerAfter(keys, {.wait = hours(1), .quiet = {}}), nobody);
+  }
 }
 
 TEST_F(ATerminalAlert, ForgetsWhatWasTypedBeforeItStood) {
@@ -116,7 +139,7 @@ TEST_F(ATerminalAlert, ForgetsWhatWasTypedBeforeItStood) {
 }
 
 TEST_F(ATerminalAlert, EndsUnansweredWhenTheTerminalHangsUp) {
-  TerminalAlert alert({.terminal = _terminal, .armedAfter = milliseconds(0)});
+  TerminalAlert alert({.terminal = _terminal, .timing = atOnce});
   const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
   close(_screen);
   _screen = -1;
@@ -126,7 +149,7 @@ TEST_F(ATerminalAlert, EndsUnansweredWhenTheTerminalHangsUp) {
 }
 
 TEST_F(ATerminalAlert, EndsUnansweredWhenItIsTakenDown) {
-  TerminalAlert alert({.terminal = _terminal, .armedAfter = milliseconds(0)});
+  TerminalAlert alert({.terminal = _terminal, .timing = atOnce});
   const auto handle = alert.createAlert(AlertAllocator::defaultAllocator, 0, AlertFlagsPlain, nullptr, _description);
   auto answer = std::async(std::launch::async, [&] {
     AlertResponse response = 0;

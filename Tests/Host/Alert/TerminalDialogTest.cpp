@@ -37,7 +37,7 @@ AlertSubject photos() {
 }
 
 std::string drawn(const AlertQuestion& question, std::size_t columns) {
-  return drawDialog(question, DialogButton::allow, columns);
+  return drawDialog(question, AlertPlace::allow, columns);
 }
 
 // The lines without their escape sequences and without what keeps the frame's right side straight.
@@ -71,7 +71,7 @@ TEST(TheDialog, SaysWhatIsAskedAndWhoAsks) {
                           "             org.example.photos",   //
                           "Identity     Certain (sandboxed)",  //
                           "Account      ada",                  //
-                          "", "[ Don’t Allow ]  [ Allow ]"));
+                          "", "[ Don’t Allow ]  [ Allow ]", "Tab chooses a button, Return presses it, Escape closes."));
 }
 
 TEST(TheDialog, SpeaksTheLanguageOfItsSentences) {
@@ -92,9 +92,28 @@ TEST(TheDialog, LeavesOutWhatIsNotKnown) {
   AlertSubject program{.applicationName = "/usr/bin/photos", .applicationID = "/usr/bin/photos"};
   EXPECT_THAT(textOf(drawn(askedQuestion(askingFor("photos"), program, "en"), 80)),
               ElementsAre(testing::_, "", testing::_, "", "Application  /usr/bin/photos",
-                          "Identity     Only claimed (not sandboxed)", "", testing::_));
+                          "Identity     Only claimed (not sandboxed)", "", testing::_, testing::_));
   EXPECT_THAT(textOf(drawn(askedQuestion(askingFor("photos"), std::nullopt, "en"), 80)),
-              ElementsAre(testing::_, "", testing::_, "", testing::_));
+              ElementsAre(testing::_, "", testing::_, "", testing::_, testing::_));
+}
+
+TEST(TheDialog, ShowsWhatIsSelectedInReverse) {
+  const std::string edge = "│\x1b[7m \x1b[0m";
+  const auto linesWithEdge = [&](AlertPlace selected) {
+    const std::string dialog = drawDialog(askedQuestion(askingFor("Photos"), photos(), "en"), selected, 80);
+    std::string lines;
+    for (std::size_t start = 0, end = 0; (end = dialog.find("\r\n", start)) != std::string::npos; start = end + 2) {
+      lines += dialog.compare(start, edge.size(), edge) == 0 ? '#' : '.';
+    }
+    return lines;
+  };
+  EXPECT_EQ(linesWithEdge(AlertPlace::text), ".###.........");
+  EXPECT_EQ(linesWithEdge(AlertPlace::details), ".....####....");
+  for (const auto& [place, button] : {std::pair(AlertPlace::refuse, "\x1b[7m[ Don’t Allow ]\x1b[0m"),
+                                      std::pair(AlertPlace::allow, "\x1b[7m[ Allow ]\x1b[0m")}) {
+    EXPECT_EQ(linesWithEdge(place), ".............");
+    EXPECT_THAT(drawDialog(askedQuestion(askingFor("Photos"), photos(), "en"), place, 80), HasSubstr(button));
+  }
 }
 
 TEST(TheDialog, ShowsNamesAsData) {
