@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <atomic>
 #include <cerrno>
 #include <exception>
 #include <utility>
@@ -30,6 +31,8 @@ struct SessionAlertHandle final : AlertHandle {
 
   SystemAlert& frontEnd;
   std::shared_ptr<AlertHandle> shown;
+  // Shared with the watch, which may call while the handle is going away.
+  const std::shared_ptr<std::atomic<bool>> endedByLock = std::make_shared<std::atomic<bool>>(false);
   std::shared_ptr<const void> lockWatch;
 };
 
@@ -127,8 +130,11 @@ std::shared_ptr<AlertHandle> SessionAlert::createAlert(AlertAllocator allocator,
   const auto handle = std::make_shared<SessionAlertHandle>(shower, shown);
   if (description.dismissOnLock) {
     try {
-      handle->lockWatch = _watchLock([standing = std::weak_ptr(shown)] {
-        if (const auto alert = standing.lock()) takeDownShown(alert);
+      handle->lockWatch = _watchLock([standing = std::weak_ptr(shown), endedByLock = handle->endedByLock] {
+        const auto alert = standing.lock();
+        if (alert == nullptr) return;
+        *endedByLock = true;
+        takeDownShown(alert);
       });
     } catch (const std::exception&) {
       // A session without a bus cannot say that it locks; its user is asked all the same.
@@ -141,7 +147,9 @@ std::shared_ptr<AlertHandle> SessionAlert::createAlert(AlertAllocator allocator,
 int SessionAlert::receiveResponse(const std::shared_ptr<AlertHandle>& handle, double timeoutSeconds, AlertResponse& response) {
   response = AlertResponseNobody;
   const auto alert = std::dynamic_pointer_cast<SessionAlertHandle>(handle);
-  return alert == nullptr ? EINVAL : alert->frontEnd.receiveResponse(alert->shown, timeoutSeconds, response);
+  if (alert == nullptr) return EINVAL;
+  const int status = alert->frontEnd.receiveResponse(alert->shown, timeoutSeconds, response);
+  return status == 0 && response == AlertResponseNobody && *alert->endedByLock ? ECANCELED : status;
 }
 
 void SessionAlert::releaseAlert(std::shared_ptr<AlertHandle> handle) { handle.reset(); }

@@ -5,9 +5,9 @@
 /// The front end is chosen for each alert: the configured one first, then whatever can keep the alert above other windows: the
 /// helper's window, or the portal's dialog on GNOME, which shows it above everything, and where no window can be kept on top.
 /// The other of the two is next, then the terminal. When none of them can be used, nobody is asked. An alert that is to go when
-/// the session locks is taken down then, whatever shows it. Threads: as `SystemAlert` says; `takeDown`, `frontEnd` and
-/// `trouble` may be called from any thread. Ownership: a handle owns what shows it. Errors: an alert that no front end can show
-/// is a null handle, and nobody's answer.
+/// the session locks is taken down then, whatever shows it, and `receiveResponse` returns ECANCELED. Threads: as `SystemAlert`
+/// says; `takeDown`, `frontEnd` and `trouble` may be called from any thread. Ownership: a handle owns what shows it. Errors: an
+/// alert that no front end can show is a null handle, and nobody's answer.
 
 #include <functional>
 #include <memory>

@@ -110,6 +110,10 @@ class AccountsService {
                              const std::optional<Value>& value) = 0;
   virtual Dictionary status(const BusCaller& caller) = 0;
 
+  /// Whether what the caller posts on the notification bus is passed on. Does not throw: whoever cannot be identified posts
+  /// nothing.
+  virtual bool mayPost(const BusCaller& caller) = 0;
+
   /// The caller withdraws a pending request of its own.
   virtual void close(std::uint64_t requestIdentifier) = 0;
   /// A connection went away; whatever it asked for and is not answered is withdrawn.

@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "Host/Alert/PortalBackend.h"
+#include "Host/Bus/SignalSender.h"
 #include "Host/Files/FileDescriptor.h"
 #include "Host/Text/ValidText.h"
 
@@ -38,21 +39,6 @@ constexpr const char* unnamedApplication = "";
 constexpr const char* noParentWindow = "";
 
 using Options = std::map<std::string, sdbus::Variant>;
-
-std::optional<std::string> ownerOf(sdbus::IConnection& bus, const std::string& name) {
-  try {
-    std::string owner;
-    sdbus::createProxy(bus, busDriver, busDriverPath)
-        ->callMethod("GetNameOwner")
-        .onInterface(busDriver)
-        .withArguments(name)
-        .storeResultsTo(owner);
-    return owner;
-  } catch (const sdbus::Error& error) {
-    if (error.getName() == "org.freedesktop.DBus.Error.NameHasNoOwner") return std::nullopt;
-    throw;
-  }
-}
 
 // The type of what is read next; a zero byte at the end.
 std::string nextType(const sdbus::Message& message) {
@@ -86,7 +72,7 @@ class BusAccessDialog final : public AccessDialog {
     _ownerWatch = _connection->addMatch(
         "type='signal',sender='" + std::string(busDriver) + "',member='NameOwnerChanged',arg0='" + backend + "'",
         [this](sdbus::Message& signal) { ownerChanged(signal); });
-    _owner = ownerOf(*_connection, backend);
+    _owner = ownerOnBus(*_connection, backend);
     ask(question);
   }
 
@@ -149,6 +135,7 @@ class BusAccessDialog final : public AccessDialog {
   }
 
   void ownerChanged(sdbus::Message& signal) {
+    if (!isFromBus(signal)) return;
     std::string name;
     std::string before;
     std::string after;
@@ -218,7 +205,7 @@ class BusAccessDialog final : public AccessDialog {
 bool isOnSessionBus(const std::string& name) {
   try {
     const auto bus = sdbus::createSessionBusConnection();
-    if (ownerOf(*bus, name)) return true;
+    if (ownerOnBus(*bus, name)) return true;
     std::vector<std::string> names;
     sdbus::createProxy(*bus, busDriver, busDriverPath)
         ->callMethod("ListActivatableNames")

@@ -4,6 +4,8 @@
 
 #include <string>
 
+#include "Host/Bus/BusLoop.h"
+
 namespace palisade {
 namespace {
 
@@ -34,8 +36,13 @@ std::shared_ptr<NotificationRegistration> BusNotifications::registerHandler(std:
                                                                             std::shared_ptr<SerialQueue> queue,
                                                                             std::function<void()> handler) {
   const std::string rule = "type='signal',interface='com.veltran.Notify1',member='Posted',arg0=" + quoted(name);
-  return std::make_shared<Registration>(_connection.addMatch(
-      rule, [queue = std::move(queue), handler = std::move(handler)](sdbus::Message&) { queue->async(handler); }));
+  // A signal that is sent straight to this connection has passed no rule of the bus's.
+  return std::make_shared<Registration>(
+      _connection.addMatch(rule, [this, queue = std::move(queue), handler = std::move(handler)](sdbus::Message& message) {
+        BusLoop::defer([this, queue, handler, poster = message.getSender()] {
+          if (_mayPost(poster)) queue->async(handler);
+        });
+      }));
 }
 
 }  // namespace palisade

@@ -14,6 +14,7 @@
 #include "Host/Bus/BusNotifications.h"
 #include "Host/Bus/RequestBounds.h"
 #include "Host/Bus/RequestObjects.h"
+#include "Host/Bus/SignalSender.h"
 #include "Host/Bus/TokenPipe.h"
 #include "Host/Text/ValidText.h"
 
@@ -102,7 +103,7 @@ class BusServer::Implementation final : private OwnedConnection,
         _service(service),
         _onTrouble(std::move(onTrouble)),
         _loop(*_connection, _onTrouble),
-        _notifications(*_connection),
+        _notifications(*_connection, [this](const std::string& poster) { return mayPost(poster); }),
         _requests(*_connection, [this](std::uint64_t identifier) { _service.close(identifier); }) {
     _connection->addMatch(
         "type='signal',sender='org.freedesktop.DBus',interface='org.freedesktop.DBus',member='NameOwnerChanged',arg2=''",
@@ -335,8 +336,10 @@ class BusServer::Implementation final : private OwnedConnection,
 
   // Who sent the message that is being handled. The bus is asked once a connection.
   std::shared_ptr<const BusCaller> callerOfThisMessage() {
-    const sdbus::Message* message = getObject().getCurrentlyProcessedMessage();
-    const std::string uniqueName = message->getSender();
+    return callerNamed(getObject().getCurrentlyProcessedMessage()->getSender());
+  }
+
+  std::shared_ptr<const BusCaller> callerNamed(const std::string& uniqueName) {
     const std::lock_guard lock(_mutex);
     const auto known = _callers.find(uniqueName);
     if (known != _callers.end()) return known->second;
@@ -368,7 +371,16 @@ class BusServer::Implementation final : private OwnedConnection,
     return answer;
   }
 
+  bool mayPost(const std::string& uniqueName) {
+    try {
+      return _service.mayPost(*callerNamed(uniqueName));
+    } catch (const BusFailure&) {
+      return false;
+    }
+  }
+
   void nameVanished(sdbus::Message& message) {
+    if (!isFromBus(message)) return;
     std::string name;
     message >> name;
     {

@@ -8,8 +8,12 @@
 #include <string>
 #include <thread>
 
+#include "Host/Bus/SignalSender.h"
+
 namespace palisade {
 namespace {
+
+using NameOwners = std::vector<std::unique_ptr<NameOwner>>;
 
 constexpr const char* logins = "org.freedesktop.login1";
 constexpr const char* loginSession = "org.freedesktop.login1.Session";
@@ -24,10 +28,11 @@ std::vector<LoginSession> loginSessions(sdbus::IConnection& bus) {
   return sessions;
 }
 
-// What a handler cannot read is no lock.
+// What a handler cannot read is no lock, and neither is what somebody else says than whoever knows.
 template <typename Read>
-sdbus::message_handler whenLocked(const std::function<void()>& onLock, Read isLock) {
-  return [&onLock, isLock](sdbus::Message& message) {
+sdbus::message_handler whenLocked(const std::function<void()>& onLock, const NameOwner& knower, Read isLock) {
+  return [&onLock, &knower, isLock](sdbus::Message& message) {
+    if (!knower.hasSent(message)) return;
     bool isLocked = false;
     try {
       isLocked = isLock(message);
@@ -57,7 +62,10 @@ bool saysItIsLocked(sdbus::Message& message) {
 // Reads a bus until it is destroyed or the bus is gone.
 class SessionLock::Listener {
  public:
-  explicit Listener(std::unique_ptr<sdbus::IConnection> bus) : _bus(std::move(bus)), _thread([this] { read(); }) {}
+  Listener(std::unique_ptr<sdbus::IConnection> bus, NameOwners knowers)
+      : _bus(std::move(bus)),
+        _knowers(std::move(knowers)),
+        _thread([this] { read(); }) {}
   Listener(const Listener&) = delete;
   Listener& operator=(const Listener&) = delete;
   ~Listener() {
@@ -76,6 +84,7 @@ class SessionLock::Listener {
   }
 
   std::unique_ptr<sdbus::IConnection> _bus;
+  NameOwners _knowers;
   std::thread _thread;
 };
 
@@ -92,28 +101,32 @@ SessionLock::SessionLock(std::function<void()> onLock) : _onLock(std::move(onLoc
 
 SessionLock::~SessionLock() = default;
 
-// Screen savers differ in where their object is; what they say is the same.
+// Screen savers differ in where their object is; what they say is the same, and each owns the name of its interface.
 void SessionLock::listenToScreenSaver() {
   auto bus = sdbus::createSessionBusConnection();
-  for (const char* interface : {"org.freedesktop.ScreenSaver", "org.gnome.ScreenSaver"}) {
-    bus->addMatch("type='signal',member='ActiveChanged',interface='" + std::string(interface) + "'",
-                  whenLocked(_onLock, becomesActive), sdbus::floating_slot);
+  NameOwners savers;
+  for (const std::string saver : {"org.freedesktop.ScreenSaver", "org.gnome.ScreenSaver"}) {
+    savers.push_back(std::make_unique<NameOwner>(*bus, saver));
+    bus->addMatch("type='signal',sender='" + saver + "',member='ActiveChanged',interface='" + saver + "'",
+                  whenLocked(_onLock, *savers.back(), becomesActive), sdbus::floating_slot);
   }
-  _listeners.push_back(std::make_unique<Listener>(std::move(bus)));
+  _listeners.push_back(std::make_unique<Listener>(std::move(bus), std::move(savers)));
 }
 
 // `loginctl lock-session` sends Lock; a desktop that locks by itself sets LockedHint. Other users' sessions are none of ours.
 void SessionLock::listenToLogins() {
   auto bus = sdbus::createSystemBusConnection();
+  NameOwners managers;
+  const NameOwner& manager = *managers.emplace_back(std::make_unique<NameOwner>(*bus, logins));
   for (const LoginSession& session : loginSessions(*bus)) {
     if (std::get<1>(session) != getuid()) continue;
     const std::string ofSession = "type='signal',sender='" + std::string(logins) + "',path='" + std::get<4>(session) + "',";
     bus->addMatch(ofSession + "member='Lock',interface='" + loginSession + "'",
-                  whenLocked(_onLock, [](sdbus::Message&) { return true; }), sdbus::floating_slot);
+                  whenLocked(_onLock, manager, [](sdbus::Message&) { return true; }), sdbus::floating_slot);
     bus->addMatch(ofSession + "member='PropertiesChanged',interface='org.freedesktop.DBus.Properties'",
-                  whenLocked(_onLock, saysItIsLocked), sdbus::floating_slot);
+                  whenLocked(_onLock, manager, saysItIsLocked), sdbus::floating_slot);
   }
-  _listeners.push_back(std::make_unique<Listener>(std::move(bus)));
+  _listeners.push_back(std::make_unique<Listener>(std::move(bus), std::move(managers)));
 }
 
 }  // namespace palisade

@@ -1,6 +1,7 @@
 #pragma once
 
-/// Hears that the user's session is being locked: from the session's screen saver, and from the login manager.
+/// Hears that the user's session is being locked: from the session's screen saver, and from the login manager. Nobody
+/// else is believed.
 ///
 /// Threads: made and destroyed by one thread; `onLock` comes from a thread of its own until the destructor returns. Ownership:
 /// owns its connections. Errors: a bus that cannot be reached is not listened to, nor is one that has gone; without any, the

@@ -135,6 +135,14 @@ std::string AccountOperations::credential(const BusCaller& caller, const std::st
   throw BusFailure(BusFailureKind::notGranted, "The grant of " + client->description() + " carries no token. Ask again.");
 }
 
+bool AccountOperations::mayPost(const BusCaller& caller) {
+  try {
+    return clientOf(caller)->clientClass() != ClientClass::sandboxed;
+  } catch (const BusFailure&) {
+    return false;
+  }
+}
+
 void AccountOperations::close(std::uint64_t requestIdentifier) {
   withdraw([&](const Running& running) { return running.request == requestIdentifier; });
 }

@@ -72,6 +72,8 @@ class AccountOperations final : public AccountsService {
                      const std::optional<Value>& value) override;
   Dictionary status(const BusCaller& caller) override;
 
+  bool mayPost(const BusCaller& caller) override;
+
   void close(std::uint64_t requestIdentifier) override;
   void callerLeft(const std::string& uniqueName) override;
 

@@ -105,6 +105,7 @@ int AlertScheduler::receiveResponse(const std::shared_ptr<AlertHandle>& handle, 
         operation == nullptr ? nullptr : operation->interruptWith([this, place] { _takeDown(place->shown); });
     status = _frontEnd.receiveResponse(place->shown, timeoutSeconds, word);
   }
+  if (status == ECANCELED) return 0;
   const bool isButton = word == AlertResponseDefaultButton || word == AlertResponseAlternateButton;
   // An answer that comes after the withdrawal, or beside an error, is nobody's.
   if (status != 0 || !isButton || (operation != nullptr && operation->isWithdrawn())) {

@@ -7,7 +7,8 @@
 /// to the user, and the operation fails with a sentence that says so.
 /// Threads: as `SystemAlert` says; alerts are shown in the order in which they were created. Ownership: borrows the front end,
 /// the cool-down and the log. Errors: an alert of a withdrawn operation is never shown and is nobody's answer; so is every word
-/// that is neither button's.
+/// that is neither button's. A front end says ECANCELED when it took the alert down because the session locked: the application
+/// can do nothing about that, so it does not count towards its cool-down.
 
 #include <condition_variable>
 #include <cstdint>

@@ -186,6 +186,22 @@ class Handles(HostileCallers):
             stranger.grants()
             self.assertEqual([message for message in stranger.inbox if message.fields.get(3) == "Response"], [])
 
+    def test_stand_when_somebody_else_claims_that_their_caller_has_left(self):
+        request = self.caller.start_request()
+        self.assertEqual(request.reply()[0], PENDING)
+        self.session.person.wait_for_alert(1)
+        bus = "org.freedesktop.DBus"
+        with self.session.caller() as stranger:
+            for destination in (NAME, None):
+                stranger.emit(destination, "/org/freedesktop/DBus", bus, "NameOwnerChanged", "sss",
+                              [self.caller.name, self.caller.name, ""])
+            stranger.grants()
+        self.caller.grants()
+        self.assertEqual([message for message in self.caller.inbox if message.fields.get(3) == "Response"], [])
+        request.close()
+        self.assertEqual(request.response()[0], WITHDRAWN)
+        self.assertEqual(self.session.person.alerts, 1)
+
 
 class Floods(HostileCallers):
     def test_of_requests_are_cut_at_the_bound_and_delay_nobody_else(self):

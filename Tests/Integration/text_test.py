@@ -181,15 +181,7 @@ class Names(Texts):
             record.write_text(written, encoding="utf-8")
 
     def ask_in_sandbox(self) -> int:
-        """What an application's request comes to that Flatpak would have started, in a root of its own."""
-        info = self.session.root / "info"
-        info.write_text("[Application]\nname=org.example.Sandboxed\n", encoding="utf-8")
-        seen = [word for folder in ("/usr", sys.base_prefix, trial.PROJECT, self.session.root)
-                for word in ("--ro-bind", folder, folder)]
-        links = [word for folder in ("bin", "lib", "lib64") for word in ("--symlink", f"usr/{folder}", f"/{folder}")]
-        finished = self.session.run("bwrap", "--unshare-user", "--unshare-pid", "--dev", "/dev", "--proc", "/proc", *seen, *links,
-                                    "--ro-bind", info, "/.flatpak-info",
-                                    trial.THIS_PROGRAM, "-c", ASK_FOR_ACCESS, HERE, self.session.bus)
+        finished = self.session.run_sandboxed("org.example.Sandboxed", trial.THIS_PROGRAM, "-c", ASK_FOR_ACCESS, HERE, self.session.bus)
         self.assertEqual(finished.returncode, 0, finished.stdout)
         return json.loads(finished.stdout)
 

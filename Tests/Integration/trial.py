@@ -206,6 +206,15 @@ class Trial:
         return subprocess.run([str(word) for word in command], env=self.environment, text=True, timeout=60, check=False,
                               stdout=subprocess.PIPE, stderr=subprocess.STDOUT, **more)
 
+    def run_sandboxed(self, application: str, *command) -> subprocess.CompletedProcess:
+        """Runs a command as Flatpak would run the application: in a root of its own that says which one it is."""
+        info = self.root / "flatpak-info"
+        info.write_text(f"[Application]\nname={application}\n", encoding="utf-8")
+        seen = [word for folder in ("/usr", sys.base_prefix, PROJECT, BUILD, self.root) for word in ("--ro-bind", folder, folder)]
+        links = [word for folder in ("bin", "lib", "lib64") for word in ("--symlink", f"usr/{folder}", f"/{folder}")]
+        return self.run("bwrap", "--unshare-user", "--unshare-pid", "--dev", "/dev", "--proc", "/proc", *seen, *links,
+                        "--ro-bind", info, "/.flatpak-info", *command)
+
     def _start_bus(self) -> None:
         path = self.root / "bus"
         configuration = self.root / "bus.conf"

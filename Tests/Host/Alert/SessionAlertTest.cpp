@@ -117,7 +117,9 @@ TEST_F(ADesktopSession, TakesItsAlertDownWhenItLocks) {
   const auto handle = show(alert, "linger");
   ASSERT_NE(_onLock, nullptr);
   _onLock();
-  EXPECT_EQ(responseTo(alert, handle), AlertResponseNobody);
+  AlertResponse response = 42;
+  EXPECT_EQ(alert.receiveResponse(handle, 0, response), ECANCELED);
+  EXPECT_EQ(response, AlertResponseNobody);
 }
 
 TEST_F(ADesktopSession, ListensToLocksOnlyWhileAnAlertStandsThatIsToGo) {

@@ -93,6 +93,35 @@ class AnAlert(dbusmock.DBusTestCase):
         self.lock("c1")
         self.assert_goes_away()
 
+    def forge(self, bus, path, interface, member, signature, *values):
+        """Says on a connection of its own what somebody else would: to everybody, and to each connection alone."""
+        forger = dbus.connection.Connection(os.environ[bus])
+        forger.call_blocking("org.freedesktop.DBus", "/org/freedesktop/DBus", "org.freedesktop.DBus", "Hello", "", [])
+        names = forger.call_blocking("org.freedesktop.DBus", "/org/freedesktop/DBus", "org.freedesktop.DBus", "ListNames", "", [])
+        for destination in [None, *(name for name in names if name.startswith(":"))]:
+            signal = dbus.lowlevel.SignalMessage(path, interface, member)
+            signal.append(*values, signature=signature)
+            if destination:
+                signal.set_destination(destination)
+            forger.send_message(signal)
+        forger.flush()
+        forger.close()
+
+    def test_stands_through_locks_that_others_claim(self):
+        session, system = "DBUS_SESSION_BUS_ADDRESS", "DBUS_SYSTEM_BUS_ADDRESS"
+        for saver in ("org.freedesktop.ScreenSaver", "org.gnome.ScreenSaver"):
+            self.forge(session, "/org/freedesktop/ScreenSaver", saver, "ActiveChanged", "b", True)
+        path = "/org/freedesktop/login1/session/c1"
+        self.forge(system, path, f"{LOGINS}.Session", "Lock", "")
+        self.forge(system, path, "org.freedesktop.DBus.Properties", "PropertiesChanged", "sa{sv}as", f"{LOGINS}.Session",
+                   {"LockedHint": True}, [])
+        # Nor does it help to claim the name for oneself.
+        for bus, name in ((session, "org.freedesktop.ScreenSaver"), (session, "org.gnome.ScreenSaver"), (system, LOGINS)):
+            self.forge(bus, "/org/freedesktop/DBus", "org.freedesktop.DBus", "NameOwnerChanged", "sss", name, "", ":1.0")
+        self.assert_stands()
+        self.lock("c1")
+        self.assert_goes_away()
+
 
 class AnAlertWithoutABus(unittest.TestCase):
     def test_stands(self):

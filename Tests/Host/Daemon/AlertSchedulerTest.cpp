@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cerrno>
 #include <condition_variable>
 #include <future>
 #include <memory>
@@ -223,6 +224,14 @@ TEST_F(Alerts, ThatComeAndGoWithoutEndAreNotShownForAWhile) {
   }
   EXPECT_THAT(log.messages, SizeIs(1));
   EXPECT_EQ(ask("photos").operation->failure()->kind(), BusFailureKind::notAsked);
+}
+
+TEST_F(Alerts, ThatALockTookDownAreNotCounted) {
+  screen.status = ECANCELED;
+  for (int time = 0; time < 100; ++time) EXPECT_EQ(answered("photos", AlertResponseNobody), AlertResponseNobody);
+  screen.status = 0;
+  EXPECT_THAT(log.messages, IsEmpty());
+  EXPECT_EQ(answered("photos", AlertResponseDefaultButton), AlertResponseDefaultButton);
 }
 
 TEST_F(Alerts, ThatNobodyCouldSeeAreNotCounted) {
