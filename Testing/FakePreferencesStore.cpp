@@ -15,14 +15,14 @@ void FakePreferencesStore::set(std::string_view key, std::string_view domain, st
   }
 }
 
-std::optional<Value> FakePreferencesStore::copyValue(std::string_view key, std::string_view domain, PreferencesUser,
-                                                     PreferencesHost) {
+std::optional<Value> FakePreferencesStore::copyValue(std::string_view key, std::string_view domain, PreferencesUser user,
+                                                     PreferencesHost host) {
   _instruments.faults.enter("Preferences.copyValue");
   _instruments.trace.record("Preferences.copyValue", {{"queue", traceText(FakeSerialQueue::labelOfCurrent())},
                                                       {"key", key},
                                                       {"domain", domain},
-                                                      {"user", "current"},
-                                                      {"host", "any"}});
+                                                      {"user", user == PreferencesUser::current ? "current" : "another"},
+                                                      {"host", host == PreferencesHost::any ? "any" : "another"}});
   const std::lock_guard lock(_mutex);
   const auto found = _values.find({std::string(key), std::string(domain)});
   return found == _values.end() ? std::nullopt : std::optional(found->second);

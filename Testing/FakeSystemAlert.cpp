@@ -31,11 +31,11 @@ std::size_t FakeSystemAlert::standingAlerts() const {
   return _standing;
 }
 
-std::shared_ptr<AlertHandle> FakeSystemAlert::createAlert(AlertAllocator, double timeoutSeconds, unsigned flags,
+std::shared_ptr<AlertHandle> FakeSystemAlert::createAlert(AlertAllocator allocator, double timeoutSeconds, unsigned flags,
                                                           int* errorPlace, const AlertDescription& description) {
   _instruments.faults.enter("SystemAlert.createAlert");
   _instruments.trace.record("SystemAlert.createAlert",
-                            {{"allocator", "default"},
+                            {{"allocator", allocator == AlertAllocator::defaultAllocator ? "default" : "another"},
                              {"timeout", timeoutSeconds},
                              {"flags", std::int64_t{flags}},
                              {"errorPlace", errorPlace == nullptr ? Value() : Value("given")},

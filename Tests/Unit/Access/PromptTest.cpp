@@ -39,7 +39,7 @@ class ThePrompt : public ::testing::Test {
     std::vector<PromptAnswer> answers;
     _platform.run([&] {
       _scene.plugin->_promptUserToApproveRequestForPermissions(
-          permissions, std::nullopt, _scene.client, _scene.makeAccount(),
+          permissions, std::string(FacebookAudienceOnlyMe), _scene.client, _scene.makeAccount(),
           [&](bool granted, bool skipServer, const PermissionSetRef& asked) {
             _platform.trace.record("prompt completion");
             answers.push_back({granted, skipServer, asked});
@@ -102,9 +102,26 @@ TEST_F(ThePrompt, ComposesForThePermissionsTheAudienceAndTheAppNameOfTheRequest)
   _platform.strings.set("ACCOUNT_ACCESS_ONE_PERMISSION_FORMAT", "%@: %@");
   _platform.strings.set("ACCCOUNT_ACCESS_WRITE", "post to %@");
   _platform.strings.set("POST_TO_FRIENDS", "friends");
-  _scene.plugin->_promptUserToApproveRequestForPermissions(permissionSet({"publish"}), std::string(FacebookAudienceFriends),
-                                                           _scene.client, nullptr, [](bool, bool, const PermissionSetRef&) {});
-  EXPECT_EQ(*shownDescription().find("message"), Value("Photos: post to friends"));
+  _platform.strings.set("POST_PRIVATELY", "nobody");
+  _platform.strings.set("POST_PUBLICALLY", "everyone");
+  const std::pair<std::string_view, const char*> cases[] = {{FacebookAudienceFriends, "Photos: post to friends"},
+                                                            {FacebookAudienceOnlyMe, "Photos: post to nobody"},
+                                                            {FacebookAudienceEveryone, "Photos: post to everyone"}};
+  for (const auto& [audience, message] : cases) {
+    _scene.plugin->_promptUserToApproveRequestForPermissions(permissionSet({"publish"}), std::string(audience), _scene.client,
+                                                             _scene.makeAccount(), [](bool, bool, const PermissionSetRef&) {});
+    EXPECT_EQ(*shownDescription().find("message"), Value(message));
+  }
+}
+
+TEST_F(ThePrompt, HasUnknownPermissionsDescribedForTheAudienceAndTheAccountOfTheRequest) {
+  _platform.social.descriptionAnswers = {{.data = R"("see the future")"}};
+  _platform.alert.answers = {userAllows()};
+  askFor(permissionSet({"future"}));
+  EXPECT_THAT(_platform.trace.named("FacebookPermissionDescriptionRequest.init"),
+              ElementsAre(Field(&Event::members, Dictionary{{"permissions", tracedSet({"future"})}, {"audience", "SELF"}})));
+  EXPECT_THAT(_platform.trace.named("FacebookPermissionDescriptionRequest.setAccessToken"),
+              ElementsAre(Field(&Event::members, Dictionary{{"token", "master token of me"}})));
 }
 
 TEST_F(ThePrompt, ShowsTheTextsOfTheTableInTheirPlaces) {

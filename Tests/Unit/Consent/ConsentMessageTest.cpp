@@ -157,16 +157,6 @@ TEST_F(TheConsentMessage, SaysNothingInTheLogOfAFallBackThatWasNotNeeded) {
   }
 }
 
-TEST_F(TheConsentMessage, LeavesThePermissionsAsTheyWere) {
-  serverDescribes(R"("new things")");
-  const PermissionSet permissions{"user_photos", "publish_actions", "manage_pages", "new_thing", "", "email"};
-  const PermissionSet before = permissions;
-
-  message(permissions);
-
-  EXPECT_EQ(permissions, before);
-}
-
 TEST_F(TheConsentMessage, TakesEveryNameInAnotherSpellingForAnUnlistedOne) {
   for (const char* name : {"Email", "email ", "user_birthdays", "friends_", "publish_", "basic_profile", "", "unknown"}) {
     serverDescribes(R"("it")");
