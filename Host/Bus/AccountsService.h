@@ -8,8 +8,6 @@
 /// wait. Ownership: arguments are values. Errors: a `BusFailure` is thrown and becomes the call's error reply; any other
 /// exception becomes the error "Failed".
 
-#include <sys/types.h>
-
 #include <cstdint>
 #include <functional>
 #include <memory>
@@ -18,6 +16,7 @@
 #include <string>
 #include <vector>
 
+#include "Host/Identity/CallingConnection.h"
 #include "Platform/Error.h"
 #include "Platform/Value.h"
 
@@ -50,13 +49,11 @@ class BusFailure : public std::runtime_error {
   BusFailureKind _kind;
 };
 
-/// A connection to the bus, as the bus itself describes it.
+/// A connection to the bus.
 struct BusCaller {
   std::string uniqueName;
-  pid_t processID = 0;
-  uid_t userID = 0;
-  /// Asks the bus once more for the process behind the connection; throws when the connection is gone.
-  std::function<pid_t()> askProcessAgain;
+  /// Asks the bus about it, and waits for the answer; throws when the connection is gone.
+  std::function<CallingConnection()> describe;
 };
 
 enum class AccessResponse : std::uint32_t { granted = 0, refused = 1, withdrawn = 2, pending = 3 };

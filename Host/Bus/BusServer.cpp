@@ -12,6 +12,7 @@
 #include "DBus/Accounts1Adaptor.h"
 #include "Host/Bus/BusLoop.h"
 #include "Host/Bus/BusNotifications.h"
+#include "Host/Bus/CallerDescriptions.h"
 #include "Host/Bus/RequestBounds.h"
 #include "Host/Bus/RequestObjects.h"
 #include "Host/Bus/SignalSender.h"
@@ -104,10 +105,16 @@ class BusServer::Implementation final : private OwnedConnection,
         _onTrouble(std::move(onTrouble)),
         _loop(*_connection, _onTrouble),
         _notifications(*_connection, [this](const std::string& poster) { return mayPost(poster); }),
-        _requests(*_connection, [this](std::uint64_t identifier) { _service.close(identifier); }) {
+        _requests(*_connection, [this](std::uint64_t identifier) { _service.close(identifier); }),
+        _described(addressOfBus(*_connection)) {
     _connection->addMatch(
         "type='signal',sender='org.freedesktop.DBus',interface='org.freedesktop.DBus',member='NameOwnerChanged',arg2=''",
         [this](sdbus::Message& message) { nameVanished(message); }, sdbus::floating_slot);
+    _connection->addMatch(
+        "type='signal',sender='org.freedesktop.DBus',interface='org.freedesktop.DBus',member='NameOwnerChanged',arg1=''",
+        [this](sdbus::Message& message) { nameAppeared(message); }, sdbus::floating_slot);
+    // Whatever is not announced from now on was there before.
+    _described.begin();
     registerAdaptor();
     ownName();
   }
@@ -334,41 +341,19 @@ class BusServer::Implementation final : private OwnedConnection,
     }
   }
 
-  // Who sent the message that is being handled. The bus is asked once a connection.
+  // Who sent the message that is being handled; the bus is asked more about it when somebody wants to know.
   std::shared_ptr<const BusCaller> callerOfThisMessage() {
     return callerNamed(getObject().getCurrentlyProcessedMessage()->getSender());
   }
 
   std::shared_ptr<const BusCaller> callerNamed(const std::string& uniqueName) {
     const std::lock_guard lock(_mutex);
-    const auto known = _callers.find(uniqueName);
-    if (known != _callers.end()) return known->second;
-    try {
-      const auto credentials = askBus<BusDictionary>("GetConnectionCredentials", uniqueName);
-      BusCaller caller{.uniqueName = uniqueName,
-                       .processID = static_cast<pid_t>(credentials.at("ProcessID").get<std::uint32_t>()),
-                       .userID = credentials.at("UnixUserID").get<std::uint32_t>(),
-                       .askProcessAgain = [this, uniqueName] { return processOf(uniqueName); }};
-      return _callers.emplace(uniqueName, std::make_shared<const BusCaller>(std::move(caller))).first->second;
-    } catch (const std::exception&) {
-      throw BusFailure(BusFailureKind::unknownCaller, "The bus does not say who is calling.");
+    auto& caller = _callers[uniqueName];
+    if (caller == nullptr) {
+      caller = std::make_shared<const BusCaller>(
+          BusCaller{.uniqueName = uniqueName, .describe = [this, uniqueName] { return _described.describe(uniqueName); }});
     }
-  }
-
-  pid_t processOf(const std::string& uniqueName) {
-    return static_cast<pid_t>(askBus<std::uint32_t>("GetConnectionUnixProcessID", uniqueName));
-  }
-
-  // On a connection of its own: a call that waits for its reply must not take messages from under the loop, nor pile up those
-  // of a flood with all the descriptors that they carry.
-  template <typename Answer>
-  Answer askBus(const char* question, const std::string& uniqueName) {
-    const std::lock_guard lock(_questionMutex);
-    if (_questions == nullptr) _questions = sdbus::createSessionBusConnection();
-    const auto bus = sdbus::createProxy(*_questions, "org.freedesktop.DBus", "/org/freedesktop/DBus");
-    Answer answer{};
-    bus->callMethod(question).onInterface("org.freedesktop.DBus").withArguments(uniqueName).storeResultsTo(answer);
-    return answer;
+    return caller;
   }
 
   bool mayPost(const std::string& uniqueName) {
@@ -383,6 +368,7 @@ class BusServer::Implementation final : private OwnedConnection,
     if (!isFromBus(message)) return;
     std::string name;
     message >> name;
+    _described.vanished(name);
     {
       const std::lock_guard lock(_mutex);
       if (_callers.erase(name) == 0) return;
@@ -390,16 +376,22 @@ class BusServer::Implementation final : private OwnedConnection,
     _service.callerLeft(name);
   }
 
+  void nameAppeared(sdbus::Message& message) {
+    if (!isFromBus(message)) return;
+    std::string name;
+    message >> name;
+    _described.appeared(name);
+  }
+
   AccountsService& _service;
   const std::function<void(const std::string&)> _onTrouble;
   BusLoop _loop;
   BusNotifications _notifications;
   RequestObjects _requests;
+  CallerDescriptions _described;
   std::mutex _mutex;
   std::map<std::string, std::shared_ptr<const BusCaller>> _callers;
   std::vector<std::function<void()>> _waitingSignals;
-  std::mutex _questionMutex;
-  std::unique_ptr<sdbus::IConnection> _questions;
 };
 
 BusServer::BusServer(AccountsService& service, std::function<void(const std::string&)> onTrouble)

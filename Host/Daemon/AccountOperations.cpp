@@ -6,6 +6,7 @@
 #include "Host/Daemon/AtEnd.h"
 #include "Host/Daemon/OperationStore.h"
 #include "Host/Daemon/StoreCall.h"
+#include "Host/Identity/ConnectionOwner.h"
 #include "Platform/AccountConstants.h"
 #include "Platform/AccountType.h"
 
@@ -151,6 +152,7 @@ void AccountOperations::callerLeft(const std::string& uniqueName) {
   {
     const std::lock_guard lock(_mutex);
     _clientsByConnection.erase(uniqueName);
+    _strangers.erase(uniqueName);
   }
   withdraw([&](const Running& running) { return running.caller == uniqueName; });
 }
@@ -184,11 +186,17 @@ std::shared_ptr<const RegisteredClient> AccountOperations::clientOf(const BusCal
     const std::lock_guard lock(_mutex);
     const auto known = _clientsByConnection.find(caller.uniqueName);
     if (known != _clientsByConnection.end()) return known->second;
+    const auto stranger = _strangers.find(caller.uniqueName);
+    if (stranger != _strangers.end()) throw BusFailure(BusFailureKind::unknownCaller, stranger->second);
   }
   try {
-    const auto client = _parts.clients.identify(caller.processID, caller.askProcessAgain);
+    const auto client = _parts.clients.identify(caller.describe());
     const std::lock_guard lock(_mutex);
     return _clientsByConnection.emplace(caller.uniqueName, client).first->second;
+  } catch (const NotItsConnection& failure) {
+    const std::lock_guard lock(_mutex);
+    _strangers.emplace(caller.uniqueName, failure.what());
+    throw BusFailure(BusFailureKind::unknownCaller, failure.what());
   } catch (const std::exception& failure) {
     throw BusFailure(BusFailureKind::unknownCaller, failure.what());
   }

@@ -117,6 +117,8 @@ class AccountOperations final : public AccountsService {
   ClientLanes _lanes;
   std::mutex _mutex;
   std::map<std::string, std::shared_ptr<const RegisteredClient>> _clientsByConnection;
+  /// Connections that are not their process's own, and how that was told.
+  std::map<std::string, std::string> _strangers;
   std::map<Operation*, Running> _running;
   /// How many tokens each connection is sending.
   std::map<std::string, std::size_t> _tokenTransfers;

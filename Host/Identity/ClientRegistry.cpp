@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "Host/Identity/ClientRecordFiles.h"
+#include "Host/Identity/ConnectionOwner.h"
 #include "Host/Identity/DesktopEntry.h"
 #include "Host/Identity/DisplayName.h"
 #include "Host/Identity/FlatpakInfo.h"
@@ -56,19 +57,6 @@ ClientRef clientFromProgram(const Program& program) {
                                                                                 .clientClass = ClientClass::bare,
                                                                                 .entitlements = {},
                                                                                 .recordFile = {}});
-}
-
-void requireConnectionOf(pid_t process, const std::function<pid_t()>& processOfConnection) {
-  pid_t now = 0;
-  try {
-    now = processOfConnection();
-  } catch (const std::exception& failure) {
-    throw IdentityError(std::string("The bus no longer knows the caller's connection: ") + failure.what());
-  }
-  if (now != process) {
-    throw IdentityError("The caller's connection belonged to process " + std::to_string(process) + " and now to process " +
-                        std::to_string(now) + ".");
-  }
 }
 
 }  // namespace
@@ -148,10 +136,9 @@ ClientRegistry::ClientRegistry(std::vector<std::filesystem::path> folders)
 
 ClientRegistry::~ClientRegistry() = default;
 
-std::shared_ptr<const RegisteredClient> ClientRegistry::identify(pid_t process,
-                                                                 const std::function<pid_t()>& processOfConnection) const {
-  const PinnedProcess caller(process);
-  requireConnectionOf(process, processOfConnection);
+std::shared_ptr<const RegisteredClient> ClientRegistry::identify(const CallingConnection& connection) const {
+  const PinnedProcess caller = processBehind(connection);
+  requireOwnConnection(caller, connection);
   auto client = _implementation->clientBehind(caller);
   caller.requireAlive();
   return client;

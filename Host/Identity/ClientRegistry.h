@@ -2,10 +2,11 @@
 
 /// Who is calling: from the bus and the kernel, never from what the caller says.
 ///
-/// A process is pinned with pidfd_open(2), the bus is asked again whose connection it is, and only then /proc is read, in this
-/// order: the Flatpak instance file, the snap's security label or cgroup, the systemd unit, the executable. The first that says
-/// something decides. Client records (one TOML file an application, see ClientRecord.h) give the application a bundle ID, a
-/// name, and entitlements; entitlements count only from files that belong to root and that nobody else can write.
+/// The process behind the connection is pinned, by the bus or with pidfd_open(2); it must be the one that made the connection
+/// (see ConnectionOwner.h) and this user's. Only then /proc is read, in this order: the Flatpak instance file, the snap's
+/// security label or cgroup, the systemd unit, the executable. The first that says something decides. Client records (one TOML
+/// file an application, see ClientRecord.h) give the application a bundle ID, a name, and entitlements; entitlements count only
+/// from files that belong to root and that nobody else can write.
 ///
 /// Without a record, a sandboxed application is known by the ID that its sandbox gives it, and any other program by the path of
 /// its executable alone, without a bundle ID. A script is its interpreter. What tells programs of one user apart holds against
@@ -15,14 +16,12 @@
 /// language that it names. Ownership: clients are shared. Errors: `IdentityError`; a look-up that fails refuses, and there is
 /// no default identity.
 
-#include <sys/types.h>
-
 #include <filesystem>
-#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
 
+#include "Host/Identity/CallingConnection.h"
 #include "Host/Identity/IdentityError.h"
 #include "Host/Identity/RegisteredClient.h"
 
@@ -38,9 +37,8 @@ class ClientRegistry {
   ClientRegistry(const ClientRegistry&) = delete;
   ClientRegistry& operator=(const ClientRegistry&) = delete;
 
-  /// The client behind a process. `processOfConnection` asks the bus again for the process that owns the connection; what it
-  /// throws refuses too.
-  std::shared_ptr<const RegisteredClient> identify(pid_t process, const std::function<pid_t()>& processOfConnection) const;
+  /// The client behind a connection. What the connection's functions throw refuses too.
+  std::shared_ptr<const RegisteredClient> identify(const CallingConnection& connection) const;
 
   /// The client that grants are recorded under, or none when no record has that ID any more. Its class is the weakest by which
   /// its record lets a caller in.

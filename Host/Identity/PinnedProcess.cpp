@@ -13,6 +13,8 @@
 #include <cstdlib>
 #include <cstring>
 #include <memory>
+#include <string_view>
+#include <utility>
 
 #include "Host/Identity/IdentityError.h"
 
@@ -25,22 +27,51 @@ namespace {
 constexpr std::size_t largestInfo = 64 * 1024;
 constexpr std::size_t largestLabel = 4 * 1024;
 constexpr std::size_t largestCgroups = 256 * 1024;
+constexpr std::size_t largestStatus = 64 * 1024;
 
 // The C library's own declaration cannot be used from C++.
-int openPin(pid_t process) { return static_cast<int>(syscall(SYS_pidfd_open, process, 0)); }
+std::shared_ptr<const FileDescriptor> openPin(pid_t process) {
+  return std::make_shared<const FileDescriptor>(static_cast<int>(syscall(SYS_pidfd_open, process, 0)));
+}
 
 pid_t requireNumber(pid_t process) {
   if (process > 0) return process;
   throw IdentityError("The bus does not know the caller's process; it may run in another PID namespace.");
 }
 
+// The number in "KEY:\tNUMBER", or what stands in its place; none when no line begins so.
+std::optional<long long> numberAfter(std::string_view key, std::string_view lines) {
+  for (std::size_t begin = 0; begin < lines.size();) {
+    const std::string_view line = lines.substr(begin, lines.find('\n', begin) - begin);
+    begin += line.size() + 1;
+    if (!line.starts_with(key)) continue;
+    return std::strtoll(std::string(line.substr(key.size())).c_str(), nullptr, 10);
+  }
+  return std::nullopt;
+}
+
+// A pinned process has its number in the information about the descriptor: -1 when it has ended, 0 when it is in another PID
+// namespace.
+pid_t numberOf(const FileDescriptor& pin) {
+  const FileDescriptor info(open(("/proc/self/fdinfo/" + std::to_string(pin.number())).c_str(), O_RDONLY | O_CLOEXEC));
+  const auto lines = info.isOpen() ? readAtMost(info, largestStatus) : std::nullopt;
+  const auto number = lines ? numberAfter("Pid:", *lines) : std::nullopt;
+  if (!number) throw IdentityError("The bus has pinned the caller with something that is no process.");
+  if (*number < 0) throw IdentityError("The process that made the caller's connection has ended.");
+  return requireNumber(static_cast<pid_t>(*number));
+}
+
 }  // namespace
 
-PinnedProcess::PinnedProcess(pid_t process)
-    : _process(requireNumber(process)),
-      _pin(openPin(process)),
-      _folder(_pin.isOpen() ? open(("/proc/" + std::to_string(process)).c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC) : -1) {
-  if (!_pin.isOpen()) fail("cannot be pinned");
+PinnedProcess::PinnedProcess(pid_t process) : PinnedProcess(process, openPin(requireNumber(process))) {}
+
+PinnedProcess::PinnedProcess(std::shared_ptr<const FileDescriptor> pin) : PinnedProcess(numberOf(*pin), pin) {}
+
+PinnedProcess::PinnedProcess(pid_t process, std::shared_ptr<const FileDescriptor> pin)
+    : _process(process),
+      _pin(std::move(pin)),
+      _folder(_pin->isOpen() ? open(("/proc/" + std::to_string(process)).c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC) : -1) {
+  if (!_pin->isOpen()) fail("cannot be pinned");
   if (!_folder.isOpen()) fail("is not in /proc");
 }
 
@@ -56,7 +87,7 @@ std::string PinnedProcess::readText(const FileDescriptor& file, std::size_t limi
 }
 
 void PinnedProcess::requireAlive() const {
-  pollfd pin{.fd = _pin.number(), .events = POLLIN, .revents = 0};
+  pollfd pin{.fd = _pin->number(), .events = POLLIN, .revents = 0};
   // The descriptor becomes readable when the process ends, and stays so.
   if (poll(&pin, 1, 0) == 0) return;
   throw IdentityError("The caller, process " + std::to_string(_process) + ", ended while it was being identified.");
@@ -114,6 +145,34 @@ Program PinnedProcess::program() const {
   if (length <= 0 || static_cast<std::size_t>(length) == path.size()) fail("runs a program whose path cannot be read");
   return {.path = std::string(path.data(), static_cast<std::size_t>(length)),
           .file = {.device = status.st_dev, .inode = status.st_ino}};
+}
+
+std::string PinnedProcess::readSmall(const char* name, const std::string& what) const {
+  const FileDescriptor file(openat(_folder.number(), name, O_RDONLY | O_CLOEXEC));
+  if (!file.isOpen()) fail("has " + what + " that cannot be read");
+  return readText(file, largestStatus, what);
+}
+
+uid_t PinnedProcess::user() const {
+  // Four users stand in the line: the real one, the one whose rights it has, and two more.
+  constexpr std::string_view key = "\nUid:\t";
+  const std::string status = readSmall("status", "a status");
+  const std::size_t line = status.find(key);
+  const std::size_t effective = line == std::string::npos ? line : status.find('\t', line + key.size());
+  if (effective == std::string::npos) throw IdentityError("The kernel does not say whose process the caller is.");
+  return static_cast<uid_t>(std::strtoul(status.c_str() + effective, nullptr, 10));
+}
+
+std::uint64_t PinnedProcess::startTick() const {
+  // The program's name is the second field and may hold anything, brackets and spaces too; behind it there are only numbers.
+  constexpr int fieldsBetween = 20;
+  const std::string fields = readSmall("stat", "a state");
+  std::size_t place = fields.rfind(')');
+  for (int field = 0; field < fieldsBetween && place != std::string::npos; ++field) place = fields.find(' ', place + 1);
+  const std::uint64_t start = place == std::string::npos ? 0 : std::strtoull(fields.c_str() + place, nullptr, 10);
+  // The first process of the machine alone starts at 0.
+  if (start == 0 && _process != 1) throw IdentityError("The kernel does not say when the caller started.");
+  return start;
 }
 
 }  // namespace palisade

@@ -139,11 +139,11 @@ TEST_F(ASandboxedCaller, IsRefusedWhenWhatTellsItsApplicationIsNoRegularFile) {
 TEST_F(ASandboxedCaller, ThatLeavesTakesItsSandboxAlongAndIsRefused) {
   const ClientRegistry registry({});
   CallerProcess caller(flatpak(photosInfo));
-  EXPECT_THROW(registry.identify(caller.pid(),
-                                 [&] {
-                                   caller.wait();
-                                   return caller.pid();
-                                 }),
+  EXPECT_THROW(identify(registry, caller.pid(),
+                        [&] {
+                          caller.wait();
+                          return caller.pid();
+                        }),
                IdentityError);
 }
 

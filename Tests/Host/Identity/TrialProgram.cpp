@@ -14,14 +14,14 @@
 #include <iostream>
 #include <string_view>
 
-#include "Host/Identity/ClientRegistry.h"
+#include "Tests/Host/Identity/Identify.h"
 
 namespace {
 
-int identify(pid_t process) {
+int tell(pid_t process) {
   const palisade::ClientRegistry registry({});
   try {
-    std::cout << registry.identify(process, [process] { return process; })->id() << '\n';
+    std::cout << identify(registry, process)->id() << '\n';
   } catch (const palisade::IdentityError& error) {
     std::cout << "refused: " << error.what() << '\n';
   }
@@ -54,7 +54,7 @@ int reuse(int count) {
       return caller;
     };
     try {
-      registry.identify(caller, processOfConnection);
+      identify(registry, caller, processOfConnection);
     } catch (const palisade::IdentityError&) {
       ++refused;
     }
@@ -71,6 +71,6 @@ int main(int count, char** words) {
   if (count != 3) return 2;
   const std::string_view what = words[1];
   const int number = std::atoi(words[2]);
-  if (what == "identify") return identify(number);
+  if (what == "identify") return tell(number);
   return what == "reuse" ? reuse(number) : 2;
 }
