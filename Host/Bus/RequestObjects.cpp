@@ -7,6 +7,7 @@
 #include <system_error>
 
 #include "Host/Bus/BusLoop.h"
+#include "Host/Secrets/KnownSecrets.h"
 #include "Host/Text/ValidText.h"
 
 namespace palisade {
@@ -39,10 +40,10 @@ std::string randomToken() {
   return "t" + std::to_string(number);
 }
 
-// What a server or a file had to say may be of any length.
+// What a server or a file had to say may be of any length, and may repeat what the server was sent.
 std::string explanationOf(std::string_view text) {
   constexpr std::size_t longestExplanation = 4096;
-  return validText(shortened(text, longestExplanation));
+  return KnownSecrets::ofProcess().withoutSecrets(validText(shortened(text, longestExplanation)));
 }
 
 BusDictionary resultsOf(const AccessOutcome& outcome) {

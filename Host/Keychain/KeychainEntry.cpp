@@ -3,6 +3,7 @@
 #include "Host/Accounts/StoredAccount.h"
 #include "Host/Json/Json.h"
 #include "Host/Keychain/KeychainError.h"
+#include "Host/Secrets/KnownSecrets.h"
 
 namespace palisade {
 namespace {
@@ -15,6 +16,12 @@ std::optional<Dictionary> read(std::string_view text) {
   const JsonParseResult result = NlohmannJsonParser(1, NullCharacters::refused).parse(text, JsonFragments::refused);
   if (!result.value || result.value->dictionary() == nullptr) return std::nullopt;
   return *result.value->dictionary();
+}
+
+// From here on no log and no error of this process shows it.
+void makeKnown(const AccountCredential& credential) {
+  if (credential.oauthToken()) KnownSecrets::ofProcess().remember(*credential.oauthToken());
+  KnownSecrets::ofProcess().remember(credential.refreshToken());
 }
 
 }  // namespace
@@ -38,6 +45,7 @@ std::string secretTextOfCredential(const std::shared_ptr<Account>& account, cons
   if (credential == nullptr) {
     throw KeychainError(KeychainErrorNotRepresentable, "cannot store " + describe(entry) + ": the account object holds none");
   }
+  makeKnown(*credential);
   Dictionary content;
   if (credential->oauthToken()) content.set(tokenKey, *credential->oauthToken());
   content.set(refreshTokenKey, credential->refreshToken());
@@ -60,8 +68,11 @@ std::shared_ptr<const AccountCredential> credentialInSecretText(std::string_view
     throw KeychainError(KeychainErrorTampered, "cannot read " + describe(entry) +
                                                    ": the entry is not what was written; remove it and grant access again");
   }
-  return std::make_shared<const AccountCredential>(token == nullptr ? std::nullopt : std::optional(*token->string()),
-                                                   *refreshToken->string(), Date(std::chrono::seconds(*expiryDate->integer())));
+  auto credential =
+      std::make_shared<const AccountCredential>(token == nullptr ? std::nullopt : std::optional(*token->string()),
+                                                *refreshToken->string(), Date(std::chrono::seconds(*expiryDate->integer())));
+  makeKnown(*credential);
+  return credential;
 }
 
 }  // namespace palisade

@@ -58,7 +58,8 @@ void JournalLog::logAccessRequest(const AccessRequestRecord& request) {
   try {
     if (_audit) _audit(request);
   } catch (const std::exception& error) {
-    writeToStderr(LogLevel::error, redactedText(std::string("An access request is not in the history: ") + error.what()));
+    writeToStderr(LogLevel::error, KnownSecrets::ofProcess().withoutSecrets(
+                                       redactedText(std::string("An access request is not in the history: ") + error.what())));
   }
   record("logAccessRequest", request.userPrompted ? LogLevel::notice : LogLevel::debug, "Access to %@ for %@ was %@ (%@).",
          "accountTypeIdentifier, bundleID, granted, userPrompted", request.accountTypeIdentifier, request.bundleID,

@@ -24,6 +24,17 @@ bool isSecretName(std::string_view name) {
                              [&](std::string_view word) { return lower.find(word) != std::string::npos; });
 }
 
+// An answer may repeat under another name what it holds under a secret one.
+void rememberSecretsIn(const Value& value, bool isSecret = false) {
+  if (const std::string* text = value.string()) {
+    if (isSecret) KnownSecrets::ofProcess().remember(*text);
+  } else if (const Array* array = value.array()) {
+    for (const Value& element : *array) rememberSecretsIn(element, isSecret);
+  } else if (const Dictionary* dictionary = value.dictionary()) {
+    for (const auto& [name, entry] : *dictionary) rememberSecretsIn(entry, isSecret || isSecretName(name));
+  }
+}
+
 }  // namespace
 
 std::string redactedText(std::string_view text) {
@@ -60,6 +71,9 @@ Value redactedValue(const Value& value) {
 }
 
 std::string redactedMessage(const LogRecord& record) {
+  for (const LogArgument& argument : record.arguments) {
+    if (const auto* value = std::get_if<const Value*>(&argument.content())) rememberSecretsIn(**value);
+  }
   std::vector<std::string> texts;
   texts.reserve(record.arguments.size());
   for (const LogArgument& argument : record.arguments) {
@@ -69,7 +83,7 @@ std::string redactedMessage(const LogRecord& record) {
   const std::vector<LogArgument> arguments(texts.begin(), texts.end());
   LogRecord redacted = record;
   redacted.arguments = arguments;
-  return formatLogMessage(redacted);
+  return KnownSecrets::ofProcess().withoutSecrets(formatLogMessage(redacted));
 }
 
 }  // namespace palisade

@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Where a token can be met on its way from the server to its application: on the bus, in the Secret Service."""
+"""Where a token can be met on its way from the server to its application: on the bus, in the Secret Service, in a log."""
 
 import contextlib
 import os
@@ -121,6 +121,27 @@ class AnApplicationThatUsesTheSecretService(unittest.TestCase):
         self.session.start_vantad()
         self.caller.manage("Revoke", "ss", [FACEBOOK, "org.example.photos"])
         trial.wait_until(lambda: self.caller.revocations()[0]["state"] == "confirmed", "the server confirms")
+
+
+def pieces_of(token: bytes) -> "list[bytes]":
+    """The shortest pieces of a token that tell something."""
+    return [token[place:place + 12] for place in range(token.rindex(b"-") + 1, len(token) - 11)]
+
+
+class ATokenInALog(unittest.TestCase):
+    def test_is_masked_at_every_level(self):
+        with trial.trial_with_account(log="debug") as session, session.caller() as caller:
+            tokens = [session.master_token.strip()]
+            for permissions in (["email"], ["email", "user_photos"]):
+                self.assertEqual(caller.start_request(permissions=permissions).outcome()[0], GRANTED)
+                tokens.append(caller.credential().encode())
+            session.start_vantad()
+            caller.manage("Revoke", "ss", [FACEBOOK, "org.example.photos"])
+            trial.wait_until(lambda: caller.revocations()[0]["state"] == "confirmed", "the server confirms")
+            log = (session.root / "accountd.log").read_bytes() + (session.root / "vantad.log").read_bytes()
+            self.assertIn(b"Access request response", log)
+            self.assertIn(b"[masked]", log)
+            self.assertEqual([token for token in tokens if any(piece in log for piece in pieces_of(token))], [])
 
 
 if __name__ == "__main__":

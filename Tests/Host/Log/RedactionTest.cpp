@@ -95,6 +95,20 @@ TEST(AMessage, MasksEachArgumentAndKeepsTheRest) {
       "Ada of [masked] got {\"access_token\":\"[masked]\",\"id\":\"100001\"}, [masked] and org.example 3: Refused [masked].");
 }
 
+TEST(AMessage, MasksKnownSecretsByTheirValueHoweverItIsPutTogether) {
+  KnownSecrets::ofProcess().remember("open sesame/user_photos.all");
+  EXPECT_EQ(messageOf("got %@.", {std::string_view("open sesame/user_photos.all")}), "got [masked].");
+  EXPECT_EQ(messageOf("got %@%@.", {std::string_view("open sesame/"), std::string_view("user_photos.all")}), "got [masked].");
+  EXPECT_EQ(messageOf("got %@.", {std::string_view("b3BlbiBzZXNhbWUvdXNlcl9waG90b3MuYWxs")}), "got [masked].");
+  const Value answer = Dictionary{{"message", "refused open sesame/user_photos.all"}};
+  EXPECT_EQ(messageOf("got %@.", {answer}), R"(got {"message":"refused [masked]"}.)");
+}
+
+TEST(AMessage, MasksWhatAnAnswerRepeatsUnderAnotherName) {
+  const Value answer = Dictionary{{"access_token", "let/me/in.please"}, {"debug", "issued let/me/in.please"}};
+  EXPECT_EQ(messageOf("got %@.", {answer}), R"(got {"access_token":"[masked]","debug":"issued [masked]"}.)");
+}
+
 TEST(AMessage, KeepsNumbersAndWhatIsNone) {
   EXPECT_EQ(messageOf("%d of %@", {std::size_t{7}, std::optional<std::string>()}), "7 of (null)");
 }
