@@ -154,7 +154,9 @@ int authorize(AccountsClient& client, const Output& output, const std::string& a
 
 int showHistory(AccountsClient& client, const Output& output, unsigned limit, const std::optional<std::string>& who) {
   output.list(client.history(limit, who),
-              {{"TIME", "time", Column::Kind::time},
+              {{"FIRST", "first", Column::Kind::time},
+               {"LAST", "last", Column::Kind::time},
+               {"TIMES", "count"},
                {"CLIENT", "client"},
                {"GRANTED", "granted", Column::Kind::yesNo},
                {"ASKED", "prompted", Column::Kind::yesNo}},

@@ -22,7 +22,7 @@ void AccessHistory::append(const AccessRequestRecord& record, Date at) {
   bool wakesWriter = false;
   {
     const std::lock_guard lock(_mutex);
-    _waiting.push_back({.at = at,
+    _waiting.push_back({.last = at,
                         .accountTypeIdentifier = std::string(record.accountTypeIdentifier),
                         .bundleID = record.bundleID,
                         .granted = record.granted,

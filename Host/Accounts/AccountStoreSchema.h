@@ -12,9 +12,9 @@ namespace palisade {
 /// "PlAc" in ASCII.
 inline constexpr std::int32_t accountStoreApplicationID = 0x506c4163;
 
-/// `position` and `id` count up and give the store's order. Options and permissions are JSON; NULL is none. `digest` tells a
-/// damaged record from a good one.
-inline constexpr std::array<std::string_view, 3> accountStoreMigrations{R"sql(
+/// `position` and `id` count up and give the store's order; a row of the history moves to the end when it repeats. Options and
+/// permissions are JSON; NULL is none. `digest` tells a damaged record from a good one.
+inline constexpr std::array<std::string_view, 4> accountStoreMigrations{R"sql(
   CREATE TABLE accounts (
     position INTEGER PRIMARY KEY,
     id TEXT NOT NULL UNIQUE DEFAULT (lower(hex(randomblob(16)))),
@@ -63,6 +63,21 @@ inline constexpr std::array<std::string_view, 3> accountStoreMigrations{R"sql(
 )sql",
                                                                         R"sql(
   CREATE INDEX authorizations_of_bundle ON authorizations (bundle_id);
+)sql",
+                                                                        R"sql(
+  DROP TABLE history;
+  CREATE TABLE history (
+    position INTEGER PRIMARY KEY,
+    first_at INTEGER NOT NULL,
+    last_at INTEGER NOT NULL,
+    count INTEGER NOT NULL CHECK (count > 0),
+    account_type TEXT NOT NULL,
+    bundle_id TEXT,
+    granted INTEGER NOT NULL CHECK (granted IN (0, 1)),
+    user_prompted INTEGER NOT NULL CHECK (user_prompted IN (0, 1)),
+    elapsed_seconds REAL NOT NULL
+  ) STRICT;
+  CREATE INDEX history_of_client ON history (bundle_id, position);
 )sql"};
 
 }  // namespace palisade

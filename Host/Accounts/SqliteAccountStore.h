@@ -66,13 +66,16 @@ struct StoredAuthorization {
   bool isDamaged = false;
 };
 
+/// One answer, or several of a client that are equal and follow each other.
 struct HistoryEntry {
-  Date at;
+  Date first = {};
+  Date last = {};
+  std::int64_t count = 1;
   std::string accountTypeIdentifier;
   std::optional<std::string> bundleID;
   bool granted = false;
   bool userPrompted = false;
-  double elapsedSeconds = 0.0;
+  double elapsedSeconds = 0.0;  ///< of the last one
 };
 
 struct HistoryFilter {
@@ -82,8 +85,10 @@ struct HistoryFilter {
 
 class SqliteAccountStore final : public AccountStore, public AuthorizationManager {
  public:
-  /// The history keeps this many entries, the newest.
-  static constexpr std::int64_t historyCapacity = 100'000;
+  /// How many entries the history keeps, of a client and of all. The oldest go first of those that no person was asked about,
+  /// then the oldest of the others.
+  static constexpr std::int64_t historyShareOfClient = 100;
+  static constexpr std::int64_t historyCapacity = 2'000;
 
   /// \name Opening, accounts
   ///@{

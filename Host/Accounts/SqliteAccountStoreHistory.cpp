@@ -1,7 +1,8 @@
 #include "Host/Accounts/SqliteAccountStore.h"
 
-// The history of the clients' requests. It grows by one entry a request and, once it is full, loses as many of its oldest ones
-// as come in.
+// The history of the clients' requests. What a client's last row says already is counted there, so a flood of equal answers
+// takes one row. A client has a share of the rows and all together have a number: nobody drives out what others did, and least
+// of all what a person decided.
 
 #include "Host/Accounts/SqliteAccountStoreStatements.h"
 #include "Host/Sqlite/Transaction.h"
@@ -13,10 +14,15 @@ std::optional<Error> SqliteAccountStore::appendToHistory(std::span<const History
     _connections->write([&](Database& database, const AccountStoreWriter& writer) {
       Transaction transaction(database);
       for (const HistoryEntry& entry : entries) {
-        writer.appendToHistory.execute(entry.at.time_since_epoch().count(), entry.accountTypeIdentifier, entry.bundleID,
-                                       entry.granted, entry.userPrompted, entry.elapsedSeconds);
+        const auto write = [&](const Statement& statement) {
+          return statement.execute(entry.accountTypeIdentifier, entry.bundleID, entry.granted, entry.userPrompted,
+                                   entry.last.time_since_epoch().count(), entry.elapsedSeconds);
+        };
+        if (write(writer.repeatInHistory) > 0) continue;
+        write(writer.appendToHistory);
+        writer.trimHistoryOfClient.execute(entry.bundleID, historyShareOfClient);
+        writer.trimHistory.execute(historyCapacity);
       }
-      writer.trimHistory.execute(historyCapacity);
       transaction.commit();
     });
   } catch (const SqliteError& error) {
@@ -31,12 +37,14 @@ std::vector<HistoryEntry> SqliteAccountStore::history(const HistoryFilter& filte
         filter.bundleID ? reader.historyOfClient.run(filter.limit, *filter.bundleID) : reader.history.run(filter.limit);
     std::vector<HistoryEntry> entries;
     while (row.next()) {
-      entries.push_back({.at = Date(std::chrono::seconds(row.integer(0))),
-                         .accountTypeIdentifier = row.text(1),
-                         .bundleID = row.optionalText(2),
-                         .granted = row.boolean(3),
-                         .userPrompted = row.boolean(4),
-                         .elapsedSeconds = row.real(5)});
+      entries.push_back({.first = Date(std::chrono::seconds(row.integer(0))),
+                         .last = Date(std::chrono::seconds(row.integer(1))),
+                         .count = row.integer(2),
+                         .accountTypeIdentifier = row.text(3),
+                         .bundleID = row.optionalText(4),
+                         .granted = row.boolean(5),
+                         .userPrompted = row.boolean(6),
+                         .elapsedSeconds = row.real(7)});
     }
     return entries;
   });

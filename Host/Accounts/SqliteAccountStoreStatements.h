@@ -36,11 +36,24 @@ struct AccountStoreWriter {
                                        "DELETE FROM authorizations WHERE answered_by_nobody = 1 AND client_id = ?1"),
         removeAllAnswersByNobody(database, "remove the refusals that nobody gave",
                                  "DELETE FROM authorizations WHERE answered_by_nobody = 1"),
-        appendToHistory(database, "write the history",
-                        "INSERT INTO history (at, account_type, bundle_id, granted, user_prompted, elapsed_seconds)"
-                        " VALUES (?1, ?2, ?3, ?4, ?5, ?6)"),
+        repeatInHistory(database, "write the history",
+                        "UPDATE history SET position = (SELECT max(position) FROM history) + 1, last_at = ?5,"
+                        " count = count + 1, elapsed_seconds = ?6"
+                        " WHERE position = (SELECT max(position) FROM history WHERE bundle_id IS ?2 AND account_type = ?1)"
+                        " AND granted = ?3 AND user_prompted = ?4"),
+        appendToHistory(
+            database, "write the history",
+            "INSERT INTO history (account_type, bundle_id, granted, user_prompted, first_at, last_at, elapsed_seconds,"
+            " count) VALUES (?1, ?2, ?3, ?4, ?5, ?5, ?6, 1)"),
+        // The newest row stays; of the others those go first that nobody decided, the oldest first.
+        trimHistoryOfClient(database, "shorten the history",
+                            "DELETE FROM history WHERE position IN (SELECT position FROM history WHERE bundle_id IS ?1"
+                            " AND position < (SELECT max(position) FROM history) ORDER BY user_prompted, position"
+                            " LIMIT max(0, (SELECT count(*) FROM history WHERE bundle_id IS ?1) - ?2))"),
         trimHistory(database, "shorten the history",
-                    "DELETE FROM history WHERE position <= (SELECT max(position) FROM history) - ?1") {}
+                    "DELETE FROM history WHERE position IN (SELECT position FROM history"
+                    " WHERE position < (SELECT max(position) FROM history) ORDER BY user_prompted, position"
+                    " LIMIT max(0, (SELECT count(*) FROM history) - ?1))") {}
 
   Statement addAccount;
   Statement removeAccount;
@@ -53,7 +66,9 @@ struct AccountStoreWriter {
   Statement forgetIntents;
   Statement removeAnswersByNobodyForClient;
   Statement removeAllAnswersByNobody;
+  Statement repeatInHistory;
   Statement appendToHistory;
+  Statement trimHistoryOfClient;
   Statement trimHistory;
 };
 
@@ -76,11 +91,12 @@ struct AccountStoreReader {
                        " digest FROM authorizations NOT INDEXED WHERE account_type = ?1 ORDER BY position"),
         intents(database, "list what was about to be done", "SELECT account_type, client_id, kind, app_id FROM intents"),
         history(database, "read the history",
-                "SELECT at, account_type, bundle_id, granted, user_prompted, elapsed_seconds FROM history"
+                "SELECT first_at, last_at, count, account_type, bundle_id, granted, user_prompted, elapsed_seconds FROM history"
                 " ORDER BY position DESC LIMIT ?1"),
-        historyOfClient(database, "read the history",
-                        "SELECT at, account_type, bundle_id, granted, user_prompted, elapsed_seconds FROM history"
-                        " WHERE bundle_id = ?2 ORDER BY position DESC LIMIT ?1") {}
+        historyOfClient(
+            database, "read the history",
+            "SELECT first_at, last_at, count, account_type, bundle_id, granted, user_prompted, elapsed_seconds FROM history"
+            " WHERE bundle_id = ?2 ORDER BY position DESC LIMIT ?1") {}
 
   Statement accounts;
   Statement accountsOfType;

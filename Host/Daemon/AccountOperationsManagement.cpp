@@ -239,7 +239,9 @@ Rows AccountOperations::history(const BusCaller& caller, std::uint32_t limit, co
   refuseUnlessManager(caller);
   Rows rows;
   for (const HistoryEntry& entry : _parts.history.entries({.limit = limit, .bundleID = client})) {
-    rows.push_back({{"time", unixTime(entry.at)},
+    rows.push_back({{"first", unixTime(entry.first)},
+                    {"last", unixTime(entry.last)},
+                    {"count", entry.count},
                     {"account_type", entry.accountTypeIdentifier},
                     {"client", textOrNull(entry.bundleID)},
                     {"granted", entry.granted},

@@ -55,6 +55,9 @@ class AnApplicationThatIsRefused(AnApplication):
         self.session.person.answer = "refuse"
         self.assertEqual(self.ask_often(FLOOD), {REFUSED: MOST_REFUSALS, "NotAsked": FLOOD - MOST_REFUSALS})
         self.assertEqual(self.alerts(), MOST_REFUSALS)
+        history = self.caller.manage("History")[0]
+        self.assertEqual([(row["granted"], row["prompted"], row["count"]) for row in history],
+                         [(False, False, FLOOD - MOST_REFUSALS), (False, True, MOST_REFUSALS), (True, True, 1)])
         self.assertRegex(self.refusal.message, r"turned this application's requests down .* Ask again in (60|59) minutes\.")
 
         self.assertEqual(self.caller.start_request().outcome()[0], GRANTED)

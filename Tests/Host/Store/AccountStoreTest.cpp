@@ -242,29 +242,36 @@ INSTANTIATE_TEST_SUITE_P(Kinds, AnOptionThatCannotBeKept,
                                          OptionValue{"tooDeep", nested(600)}),
                          [](const auto& each) { return each.param.name; });
 
-class History : public AccountStoreFixture {
+class History : InMemory, public AccountStoreFixture {
  protected:
-  std::optional<Error> append(const std::string& client, int second) {
-    const HistoryEntry entry{.at = Date(std::chrono::seconds(second)),
+  enum Reason { askedNobody, askedAPerson };
+
+  void append(const std::optional<std::string>& client, int second, bool granted = true, Reason reason = askedNobody) {
+    const HistoryEntry entry{.last = Date(std::chrono::seconds(second)),
                              .accountTypeIdentifier = facebookType.identifier(),
                              .bundleID = client,
-                             .granted = true,
-                             .userPrompted = true,
+                             .granted = granted,
+                             .userPrompted = reason == askedAPerson,
                              .elapsedSeconds = 0.5};
-    return store->appendToHistory({&entry, 1});
+    ASSERT_EQ(store->appendToHistory({&entry, 1}), std::nullopt);
+  }
+
+  // Rows that do not repeat each other.
+  void appendMany(const std::string& client, int count, int second = 0) {
+    for (int number = 0; number < count; ++number) append(client, second + number, number % 2 == 0);
   }
 
   std::vector<int> seconds(const HistoryFilter& filter) {
     std::vector<int> result;
     for (const HistoryEntry& entry : store->history(filter)) {
-      result.push_back(static_cast<int>(entry.at.time_since_epoch().count()));
+      result.push_back(static_cast<int>(entry.last.time_since_epoch().count()));
     }
     return result;
   }
 };
 
 TEST_F(History, KeepsEveryField) {
-  const HistoryEntry entry{.at = Date(std::chrono::seconds(-5)),
+  const HistoryEntry entry{.last = Date(std::chrono::seconds(-5)),
                            .accountTypeIdentifier = "type",
                            .bundleID = std::nullopt,
                            .granted = false,
@@ -274,7 +281,9 @@ TEST_F(History, KeepsEveryField) {
   restart();
   const auto entries = store->history({});
   ASSERT_THAT(entries, SizeIs(1));
-  EXPECT_EQ(entries[0].at, Date(std::chrono::seconds(-5)));
+  EXPECT_EQ(entries[0].first, Date(std::chrono::seconds(-5)));
+  EXPECT_EQ(entries[0].last, Date(std::chrono::seconds(-5)));
+  EXPECT_EQ(entries[0].count, 1);
   EXPECT_EQ(entries[0].accountTypeIdentifier, "type");
   EXPECT_EQ(entries[0].bundleID, std::nullopt);
   EXPECT_FALSE(entries[0].granted);
@@ -283,16 +292,75 @@ TEST_F(History, KeepsEveryField) {
 }
 
 TEST_F(History, IsListedNewestFirstWhateverTheClockSaid) {
-  for (const int second : {10, 30, 20}) ASSERT_EQ(append("a", second), std::nullopt);
+  bool granted = false;
+  for (const int second : {10, 30, 20}) append("a", second, granted = !granted);
   EXPECT_THAT(seconds({}), ElementsAre(20, 30, 10));
 }
 
 TEST_F(History, IsListedForOneClientAndUpToALimit) {
-  for (int second = 1; second <= 6; ++second) append(second % 2 == 0 ? "even" : "odd", second);
+  for (int second = 1; second <= 6; ++second) append(second % 2 == 0 ? "even" : "odd", second, second % 4 < 2);
   EXPECT_THAT(seconds({.limit = 2}), ElementsAre(6, 5));
   EXPECT_THAT(seconds({.limit = 2, .bundleID = "odd"}), ElementsAre(5, 3));
   EXPECT_THAT(seconds({.bundleID = "nobody"}), IsEmpty());
   EXPECT_THAT(seconds({.limit = 0}), IsEmpty());
+}
+
+TEST_F(History, CountsWhatRepeatsInOneRow) {
+  for (int second = 0; second < 1'000; ++second) append("a", second, false);
+  const auto entries = store->history({});
+  ASSERT_THAT(entries, SizeIs(1));
+  EXPECT_EQ(entries[0].count, 1'000);
+  EXPECT_EQ(entries[0].first, Date(std::chrono::seconds(0)));
+  EXPECT_EQ(entries[0].last, Date(std::chrono::seconds(999)));
+}
+
+TEST_F(History, HasARowOfItsOwnForEveryOtherAnswerReasonClientAndOrder) {
+  append("a", 1);
+  append("a", 2, false);
+  append("a", 3, false, askedAPerson);
+  append("a", 4);
+  append("b", 5);
+  append("a", 6);
+  append(std::nullopt, 7);
+  append(std::nullopt, 8);
+  EXPECT_THAT(seconds({}), ElementsAre(8, 6, 5, 3, 2, 1)) << "4 and 6 are equal and follow each other, and so are 7 and 8";
+}
+
+TEST_F(History, GivesAClientAShareAndTakesNothingFromOthers) {
+  append("quiet", 1);
+  appendMany("loud", 3 * SqliteAccountStore::historyShareOfClient, 10);
+  EXPECT_THAT(store->history({.limit = 10'000, .bundleID = "loud"}),
+              SizeIs(static_cast<std::size_t>(SqliteAccountStore::historyShareOfClient)));
+  EXPECT_EQ(seconds({.limit = 1}), std::vector{10 + 3 * static_cast<int>(SqliteAccountStore::historyShareOfClient) - 1});
+  EXPECT_THAT(seconds({.bundleID = "quiet"}), ElementsAre(1));
+}
+
+TEST_F(History, KeepsLongestWhatAPersonDecided) {
+  append("a", 1, true, askedAPerson);
+  append("a", 2, false, askedAPerson);
+  appendMany("a", 3 * SqliteAccountStore::historyShareOfClient, 10);
+  const auto kept = seconds({.limit = 10'000});
+  ASSERT_THAT(kept, SizeIs(static_cast<std::size_t>(SqliteAccountStore::historyShareOfClient)));
+  EXPECT_EQ(kept.back(), 1);
+  EXPECT_EQ(kept[kept.size() - 2], 2);
+}
+
+TEST_F(History, ShowsTheNewestAnswerBesideAnyNumberOfDecisions) {
+  for (int number = 0; number < SqliteAccountStore::historyShareOfClient; ++number) {
+    append("a", number, number % 2 == 0, askedAPerson);
+  }
+  append("a", 1'000);
+  const auto kept = seconds({.limit = 10'000});
+  EXPECT_THAT(kept, SizeIs(static_cast<std::size_t>(SqliteAccountStore::historyShareOfClient)));
+  EXPECT_EQ(kept.front(), 1'000);
+  EXPECT_EQ(kept.back(), 1);
+}
+
+TEST_F(History, IsBoundedForAnyNumberOfClients) {
+  append("decided", 1, true, askedAPerson);
+  for (int client = 0; client < 30; ++client) appendMany("client " + std::to_string(client), 100, 10);
+  EXPECT_THAT(store->history({.limit = 10'000}), SizeIs(static_cast<std::size_t>(SqliteAccountStore::historyCapacity)));
+  EXPECT_THAT(seconds({.bundleID = "decided"}), ElementsAre(1));
 }
 
 }  // namespace

@@ -23,7 +23,7 @@ using testing::Optional;
 using testing::SizeIs;
 
 std::vector<HistoryEntry> oneEntry(const std::string& accountType) {
-  return {{.at = Date(), .accountTypeIdentifier = accountType, .bundleID = "bundle"}};
+  return {{.accountTypeIdentifier = accountType, .bundleID = "bundle"}};
 }
 
 class ABusyStore : InMemory, public AccountStoreFixture {
@@ -81,7 +81,7 @@ TEST_F(ABusyStore, GivesEveryThreadWholeRecordsAndKeepsTheLast) {
   for (int writer = 0; writer < writers; ++writer) {
     EXPECT_THAT(get("client " + std::to_string(writer)), Optional(grantNumber(rounds)));
   }
-  EXPECT_THAT(store->history({.limit = 1000}), SizeIs(writers * (rounds + 1)));
+  EXPECT_EQ(store->history({})[0].count, writers * (rounds + 1));
 }
 
 TEST_F(ABusyStore, FindsOneRecordAmongMany) {
@@ -92,19 +92,6 @@ TEST_F(ABusyStore, FindsOneRecordAmongMany) {
     SELECT 'com.veltran.accounttype.facebook', 'other ' || number, 'Other', 1, 0, 0, 0 FROM numbers)sql");
   restart();
   EXPECT_THAT(get("client"), Optional(grantNumber(1)));
-}
-
-TEST_F(ABusyStore, KeepsTheNewestOfALongHistory) {
-  fill(R"sql(
-    WITH RECURSIVE numbers (number) AS (SELECT 1 UNION ALL SELECT number + 1 FROM numbers WHERE number < 100000)
-    INSERT INTO history (at, account_type, granted, user_prompted, elapsed_seconds)
-    SELECT number, 'type', 1, 1, 0.0 FROM numbers)sql");
-  restart();
-  store->appendToHistory(oneEntry("newest"));
-  const auto history = store->history({.limit = 200'000});
-  ASSERT_THAT(history, SizeIs(static_cast<std::size_t>(SqliteAccountStore::historyCapacity)));
-  EXPECT_EQ(history.front().accountTypeIdentifier, "newest");
-  EXPECT_EQ(history.back().at, Date(std::chrono::seconds(2))) << "the oldest one had to go";
 }
 
 // A disk of a megabyte, which this process alone sees.
