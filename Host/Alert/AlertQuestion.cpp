@@ -1,6 +1,7 @@
 #include "Host/Alert/AlertQuestion.h"
 
 #include <algorithm>
+#include <array>
 
 #include "Host/Alert/TerminalText.h"
 #include "Host/Json/Json.h"
@@ -16,6 +17,20 @@ bool isMark(std::string_view character) { return character == "\u200E" || charac
 
 bool isOverride(std::string_view character) {
   return (character >= "\u202A" && character <= "\u202E") || (character >= "\u2066" && character <= "\u2069");
+}
+
+// The marks of all languages that sentences are written in, with the blanks and marks of direction that some put within them.
+constexpr std::array<std::string_view, 13> openingMarks = {"“", "”", "„",  "«",       "「",      "『",     "‘",
+                                                           "‹", "‚", "\"", "«\u00A0", "«\u202F", "“\u200F"};
+constexpr std::array<std::string_view, 12> closingMarks = {"”", "“", "»",  "」",      "』",      "’",
+                                                           "›", "‘", "\"", "\u00A0»", "\u202F»", "\u200F”"};
+
+bool opensQuotation(std::string_view before) {
+  return std::ranges::any_of(openingMarks, [&](std::string_view mark) { return before.ends_with(mark); });
+}
+
+bool closesQuotation(std::string_view behind) {
+  return std::ranges::any_of(closingMarks, [&](std::string_view mark) { return behind.starts_with(mark); });
 }
 
 // The text of that name; none when it is missing or no text.
@@ -121,7 +136,10 @@ std::string isolated(const std::string& message, const std::string& name) {
   if (name.empty()) return message;
   std::string result;
   std::size_t position = 0;
-  for (std::size_t found = message.find(name); found != std::string::npos; found = message.find(name, position)) {
+  for (std::size_t found = message.find(name); found != std::string::npos; found = message.find(name, found + 1)) {
+    const std::string_view whole = message;
+    if (found < position || !opensQuotation(whole.substr(0, found)) || !closesQuotation(whole.substr(found + name.size())))
+      continue;
     result.append(message, position, found - position);
     result.append(firstStrongIsolate).append(name).append(popDirectionalIsolate);
     position = found + name.size();

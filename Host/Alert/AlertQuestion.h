@@ -54,8 +54,8 @@ std::optional<AlertQuestion> alertQuestionFromJson(std::string_view json);
 /// `text` on one line: controls and line breaks become spaces, what turns the direction of writing is left out.
 std::string oneLine(std::string_view text);
 
-/// `message` with every occurrence of `name` between U+2068 and U+2069, so that the letters of a name do not move the words
-/// around it.
+/// `message` with `name` between U+2068 and U+2069 wherever it stands between quotation marks, so that the letters of a name do
+/// not move the words around it. A name can be a word or a letter of the sentence, which stay as they are.
 std::string isolated(const std::string& message, const std::string& name);
 
 }  // namespace palisade

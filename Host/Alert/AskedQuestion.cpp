@@ -13,8 +13,8 @@ AlertQuestion askedQuestion(const AlertDescription& description, std::optional<A
                          .topMost = description.topMost};
   if (subject) {
     subject->applicationName = displayName(subject->applicationName);
-    subject->applicationID = displayName(subject->applicationID);
-    subject->account = displayName(subject->account);
+    subject->applicationID = displayIdentifier(subject->applicationID);
+    subject->account = displayIdentifier(subject->account);
     question.message = isolated(question.message, subject->applicationName);
     question.subject = std::move(subject);
   }

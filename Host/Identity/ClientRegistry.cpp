@@ -45,15 +45,16 @@ ClientRef clientFromSandbox(const std::string& id, const std::string& desktopFil
 // may when the file was replaced; then it says nothing.
 ClientRef clientFromProgram(const Program& program) {
   const std::string path = program.path.string();
-  const std::string shown = displayName(path);
-  if (!isShownAsItIs(path)) throw IdentityError("The caller's program has a path that cannot be shown: " + shown + ".");
+  if (!isShownAsItIs(path)) {
+    throw IdentityError("The caller's program has a path that cannot be shown: " + displayIdentifier(path) + ".");
+  }
   if (fileIdentity(program.path) != program.file) {
     throw IdentityError("The caller's program is not the one at " + path +
                         ": it was replaced or removed since it started, or runs in a container. Start it again.");
   }
   return std::make_shared<const RegisteredClient>(RegisteredClient::Description{.id = path,
                                                                                 .bundleID = std::nullopt,
-                                                                                .name = shown,
+                                                                                .name = displayNameOfProgram(path),
                                                                                 .clientClass = ClientClass::bare,
                                                                                 .entitlements = {},
                                                                                 .recordFile = {}});

@@ -5,12 +5,14 @@
 #include <cstddef>
 #include <optional>
 
+#include "Host/Text/QuotableText.h"
 #include "Host/Text/ValidText.h"
 
 namespace palisade {
 namespace {
 
-constexpr std::size_t mostCharacters = 128;
+constexpr std::size_t columnsOfName = 40;
+constexpr std::size_t columnsOfIdentifier = 120;
 
 struct Character {
   char32_t code;
@@ -45,6 +47,13 @@ std::optional<Character> firstCharacter(std::string_view text) {
 
 bool isBreak(char32_t code) { return (code >= '\t' && code <= '\r') || code == 0x85 || code == 0x2028 || code == 0x2029; }
 
+// Spaces of every width, and letters that are drawn as nothing.
+bool isBlank(char32_t code) {
+  static constexpr std::array<char32_t, 12> others = {0x20,   0xa0,   0x115f, 0x1160, 0x1680, 0x202f,
+                                                      0x205f, 0x2800, 0x3000, 0x3164, 0xffa0, 0x180e};
+  return (code >= 0x2000 && code <= 0x200a) || std::ranges::count(others, code) > 0;
+}
+
 // Controls, marks and overrides of direction, and characters that nobody sees. The joiners of Persian, Indic scripts and
 // emoji (U+200C, U+200D) change what people see, and stay.
 bool isUnseen(char32_t code) {
@@ -66,29 +75,35 @@ bool isUnseen(char32_t code) {
                                              [code](const Range& range) { return code >= range.first && code <= range.last; });
 }
 
-}  // namespace
-
-std::string displayName(std::string_view name) {
+// On one line, without what nobody sees.
+std::string onOneLine(std::string_view text) {
   std::string shown;
-  std::size_t count = 0;
   bool isApart = false;
-  while (!name.empty()) {
-    const auto character = firstCharacter(name);
-    const std::string_view bytes = name.substr(0, character ? character->length : 1);
-    name.remove_prefix(bytes.size());
+  while (!text.empty()) {
+    const auto character = firstCharacter(text);
+    const std::string_view bytes = text.substr(0, character ? character->length : 1);
+    text.remove_prefix(bytes.size());
     if (!character) continue;
-    if (character->code == ' ' || isBreak(character->code)) {
+    if (isBlank(character->code) || isBreak(character->code)) {
       isApart = !shown.empty();
       continue;
     }
     if (isUnseen(character->code)) continue;
-    count += isApart ? 2 : 1;
-    if (count > mostCharacters) return shown + "…";
     if (isApart) shown += ' ';
     isApart = false;
     shown += bytes;
   }
   return shown;
+}
+
+}  // namespace
+
+std::string displayName(std::string_view name) { return fitted(quotable(onOneLine(name)), columnsOfName); }
+
+std::string displayNameOfProgram(std::string_view path) { return fittedInItsMiddle(quotable(onOneLine(path)), columnsOfName); }
+
+std::string displayIdentifier(std::string_view identifier) {
+  return fittedInItsMiddle(onOneLine(identifier), columnsOfIdentifier);
 }
 
 bool isShownAsItIs(std::string_view text) {
