@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "Cli/AccountsClient.h"
+#include "Host/Text/PrintableText.h"
 
 namespace palisade {
 namespace {
@@ -147,8 +148,8 @@ void print(const Findings& all, const Output& output) {
   for (const Finding& finding : all) {
     std::string level = fmt::format("{:<4}", nameOf(finding.level));
     if (output.isColoured()) level = fmt::format("\x1b[{}m{}\x1b[0m", colourOf(finding.level), level);
-    fmt::print("{}  {:<14}  {}\n", level, finding.check, finding.found);
-    if (!finding.advice.empty()) fmt::print("{:<22}{}\n", "", finding.advice);
+    fmt::print("{}  {:<14}  {}\n", level, finding.check, printableText(finding.found));
+    if (!finding.advice.empty()) fmt::print("{:<22}{}\n", "", printableText(finding.advice));
   }
 }
 

@@ -7,6 +7,7 @@
 #include <cstdlib>
 
 #include "Cli/Table.h"
+#include "Host/Text/PrintableText.h"
 #include "Platform/Format.h"
 
 namespace palisade {
@@ -49,7 +50,7 @@ bool Output::isColoured() const {
 
 void Output::list(const Rows& rows, const std::vector<Column>& columns, std::string_view whenEmpty) const {
   if (_isJson) {
-    fmt::print("{}\n", compactJson(Array(rows.begin(), rows.end())));
+    fmt::print("{}\n", printableJson(compactJson(Array(rows.begin(), rows.end()))));
     return;
   }
   if (rows.empty()) {
@@ -71,9 +72,9 @@ void Output::list(const Rows& rows, const std::vector<Column>& columns, std::str
 
 void Output::say(std::string_view sentence, const Dictionary& object) const {
   if (_isJson) {
-    fmt::print("{}\n", compactJson(object));
+    fmt::print("{}\n", printableJson(compactJson(object)));
   } else {
-    fmt::print("{}\n", sentence);
+    fmt::print("{}\n", printableText(sentence));
   }
 }
 

@@ -2,6 +2,7 @@
 
 /// What the commands print: tables and sentences for people, JSON for scripts.
 ///
+/// Names, files and servers choose part of the text: none of it reaches the terminal unless it is printable, in JSON neither.
 /// Colours follow habit: never with `NO_COLOR` (no-color.org) or TERM=dumb, otherwise on a terminal.
 /// Threads: one. Errors: none.
 

@@ -2,7 +2,7 @@
 
 /// Tables for people: columns line up, whatever script they are written in.
 ///
-/// Threads: a value, used by one thread. Errors: none; what cannot be shown in cells shows as "?".
+/// Threads: a value, used by one thread. Errors: none; what is not printable shows as U+FFFD (Host/Text/PrintableText.h).
 
 #include <string>
 #include <vector>

@@ -5,9 +5,13 @@
 #include <cstdio>
 #include <cstdlib>
 #include <functional>
+#include <stdexcept>
+#include <string>
 
 #include "Cli/Commands.h"
 #include "Cli/Doctor.h"
+#include "Host/Text/PrintableText.h"
+#include "Host/Text/ValidText.h"
 #include "Platform/AccountConstants.h"
 
 namespace {
@@ -203,9 +207,18 @@ int tellFailure(const palisade::Output& output, std::string_view name, const cha
   if (output.isJson()) {
     output.say("", {{"error", name}, {"message", sentence}});
   } else {
-    std::fprintf(stderr, "palisade: %s\n", sentence);
+    std::fprintf(stderr, "palisade: %s\n", palisade::printableText(sentence).c_str());
   }
   return name == "NotGranted" ? no : error;
+}
+
+// The bus carries no other text; said here, the sentence can name the argument.
+void requireText(int argumentCount, char** argumentValues) {
+  for (int place = 1; place < argumentCount; ++place) {
+    if (palisade::isValidText(argumentValues[place])) continue;
+    throw std::runtime_error("Argument " + std::to_string(place) + ", \"" + argumentValues[place] +
+                             "\", is no text in UTF-8, or holds a character such as U+FFFF that is none.");
+  }
 }
 
 }  // namespace
@@ -228,6 +241,7 @@ int main(int argumentCount, char** argumentValues) {
   addSettingCommands(app, arguments);
 
   try {
+    requireText(argumentCount, argumentValues);
     app.parse(argumentCount, argumentValues);
     return arguments.command();
   } catch (const CLI::ParseError& problem) {

@@ -221,6 +221,35 @@ class Sources(Texts):
         self.assertIn("clients_trouble", self.caller.manage("GetStatus")[0])
 
 
+class ATerminal(unittest.TestCase):
+    def setUp(self):
+        self.session = self.enterContext(trial.Trial(log="error"))
+        self.session.add_client("album")
+        self.session.start_accountd()
+        self.session.add_account()
+
+    def test_sees_nothing_of_a_servers_explanation_that_could_steer_it(self):
+        request = ("album", "request", "--app", "1", "--permission", "email")
+        for words in (request, (*request, "--json")):
+            self.session.sandbox("fault", "message", "--path", "/oauth/authorization")
+            refused = self.session.run(*words)
+            self.assertEqual(refused.returncode, 1, refused.stdout)
+            line = refused.stdout.rstrip("\n").split("\n")[-1]
+            self.assertIn("Access is granted.", line, "what the server said is on one line")
+            with self.subTest(words=words):
+                self.assertTrue(line.isprintable(), ascii(line))
+                if "--json" in words:
+                    self.assertIn("\x1b[31m", json.loads(line)["error_message"])
+            self.session.run("palisade", "revoke", "org.example.album")
+
+    def test_is_told_which_argument_is_no_text(self):
+        for words in (("revoke", "x\uffff"), ("preferences", "set", "key", b"\xff"), ("notify", "\ufdd0")):
+            done = subprocess.run(["palisade", *words], env=self.session.environment, capture_output=True, timeout=60, check=False)
+            with self.subTest(words=words):
+                self.assertEqual(done.returncode, 2)
+                self.assertIn(f"Argument {len(words)}, ", done.stderr.decode())
+
+
 class TheSocialDaemon(Texts):
     def test_lives_on_when_it_is_sent_what_it_cannot_read(self):
         vantad = self.session.start_vantad()
