@@ -138,7 +138,7 @@ std::string AccountOperations::credential(const BusCaller& caller, const std::st
 
 bool AccountOperations::mayPost(const BusCaller& caller) {
   try {
-    return clientOf(caller)->clientClass() != ClientClass::sandboxed;
+    return !clientOf(caller)->isInSandbox();
   } catch (const BusFailure&) {
     return false;
   }
@@ -203,7 +203,7 @@ std::shared_ptr<const RegisteredClient> AccountOperations::clientOf(const BusCal
 }
 
 void AccountOperations::refuseUnlessManager(const BusCaller& caller) {
-  if (clientOf(caller)->clientClass() == ClientClass::sandboxed) {
+  if (clientOf(caller)->isInSandbox()) {
     throw BusFailure(BusFailureKind::notPermitted, "A sandboxed application may not manage accounts and grants.");
   }
 }

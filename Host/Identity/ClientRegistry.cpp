@@ -1,5 +1,7 @@
 #include "Host/Identity/ClientRegistry.h"
 
+#include <fcntl.h>
+
 #include <utility>
 
 #include "Host/Identity/ClientRecordFiles.h"
@@ -7,13 +9,14 @@
 #include "Host/Identity/DesktopEntry.h"
 #include "Host/Identity/DisplayName.h"
 #include "Host/Identity/FlatpakInfo.h"
+#include "Host/Identity/Namespaces.h"
 #include "Host/Identity/PinnedProcess.h"
 #include "Host/Identity/SnapName.h"
 #include "Host/Identity/UnitName.h"
 
-// Sandboxes say who is inside them. A unit says for whom it was started, and the executable says what runs; both are weaker, so
-// they count for an application only when a record says that they are enough. Whoever fits two records is refused: a guess
-// would hand one application's grants to the other.
+// Sandboxes say who is inside them; one that does not is still one. A unit says for whom it was started, and the executable
+// says what runs; both are weaker, so they count for an application only when a record says that they are enough. Whoever fits
+// two records is refused: a guess would hand one application's grants to the other.
 
 namespace palisade {
 namespace {
@@ -41,10 +44,14 @@ ClientRef clientFromSandbox(const std::string& id, const std::string& desktopFil
                                                                                 .recordFile = {}});
 }
 
+// What no other ID begins with: paths begin with a slash, and bundle IDs hold no colon.
+const std::string inSandbox = "sandbox:";
+
 // A program without a record is known by its path. In another part of the file system the path may name another file, and so it
 // may when the file was replaced; then it says nothing.
-ClientRef clientFromProgram(const Program& program) {
+ClientRef clientFromProgram(const Program& program, ClientClass clientClass) {
   const std::string path = program.path.string();
+  const bool isInSandbox = clientClass == ClientClass::unknownSandbox;
   if (!isShownAsItIs(path)) {
     throw IdentityError("The caller's program has a path that cannot be shown: " + displayIdentifier(path) + ".");
   }
@@ -52,12 +59,22 @@ ClientRef clientFromProgram(const Program& program) {
     throw IdentityError("The caller's program is not the one at " + path +
                         ": it was replaced or removed since it started, or runs in a container. Start it again.");
   }
-  return std::make_shared<const RegisteredClient>(RegisteredClient::Description{.id = path,
+  return std::make_shared<const RegisteredClient>(RegisteredClient::Description{.id = (isInSandbox ? inSandbox : "") + path,
                                                                                 .bundleID = std::nullopt,
                                                                                 .name = displayNameOfProgram(path),
-                                                                                .clientClass = ClientClass::bare,
+                                                                                .clientClass = clientClass,
                                                                                 .entitlements = {},
                                                                                 .recordFile = {}});
+}
+
+// A sandbox hides the session's users, files or processes. Whoever holds the bus sees them; the daemon may see less than that.
+bool seesWhatTheBusSees(const PinnedProcess& caller, pid_t busProcess) {
+  const FileDescriptor folder(open(("/proc/" + std::to_string(busProcess)).c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
+  const auto ofBus = busProcess > 0 && folder.isOpen() ? namespacesIn(folder) : std::nullopt;
+  if (!ofBus) throw IdentityError("The namespaces of the session bus cannot be read, so nobody can tell who is in a sandbox.");
+  const auto ofCaller = namespacesIn(caller.folder());
+  if (!ofCaller) throw IdentityError("The caller's namespaces cannot be read.");
+  return ofCaller == ofBus;
 }
 
 }  // namespace
@@ -100,7 +117,7 @@ struct ClientRegistry::Implementation {
     return clientFromSandbox(id, desktopFile, clientClass);
   }
 
-  ClientRef clientBehind(const PinnedProcess& caller) const {
+  ClientRef clientBehind(const PinnedProcess& caller, pid_t busProcess) const {
     if (const auto info = caller.flatpakInfo()) {
       const std::string id = flatpakApplicationID(*info);
       return sandboxed(&ClientMatch::flatpak, "flatpak", id, id + ".desktop", ClientClass::sandboxed);
@@ -115,6 +132,8 @@ struct ClientRegistry::Implementation {
     }
 
     const Program program = caller.program();
+    // Its unit is the one of whoever started the sandbox, and its path is one that the sandbox has laid out.
+    if (!seesWhatTheBusSees(caller, busProcess)) return clientFromProgram(program, ClientClass::unknownSandbox);
     const auto isProgram = [&](const std::filesystem::path& path) { return fileIdentity(path) == program.file; };
     if (const auto unit = caller.userUnit()) {
       const auto application = applicationOfUnit(*unit);
@@ -128,7 +147,7 @@ struct ClientRegistry::Implementation {
       return match.isRecognisedByExecutable() && isProgram(*match.executable);
     };
     if (const ClientRecord* fitting = record(fits)) return clientFrom(*fitting, ClientClass::bare);
-    return clientFromProgram(program);
+    return clientFromProgram(program, ClientClass::bare);
   }
 };
 
@@ -140,7 +159,7 @@ ClientRegistry::~ClientRegistry() = default;
 std::shared_ptr<const RegisteredClient> ClientRegistry::identify(const CallingConnection& connection) const {
   const PinnedProcess caller = processBehind(connection);
   requireOwnConnection(caller, connection);
-  auto client = _implementation->clientBehind(caller);
+  auto client = _implementation->clientBehind(caller, connection.busProcess);
   caller.requireAlive();
   return client;
 }

@@ -8,6 +8,10 @@
 /// file an application, see ClientRecord.h) give the application a bundle ID, a name, and entitlements; entitlements count only
 /// from files that belong to root and that nobody else can write.
 ///
+/// Whoever has other namespaces of users, mounts or processes than the process that holds the bus is in a sandbox too. When no
+/// information that is known here says who it is, no record fits it: it is known by the path of its executable behind
+/// "sandbox:". Two sandboxes of that kind that run one program are one client.
+///
 /// Without a record, a sandboxed application is known by the ID that its sandbox gives it, and any other program by the path of
 /// its executable alone, without a bundle ID. A script is its interpreter. What tells programs of one user apart holds against
 /// mistakes and against sandboxed applications; a program outside every sandbox can preload a library into another one, ask for

@@ -7,6 +7,7 @@ namespace palisade {
 std::string nameOf(ClientClass clientClass) {
   switch (clientClass) {
     case ClientClass::sandboxed: return "sandboxed";
+    case ClientClass::unknownSandbox: return "unknown sandbox";
     case ClientClass::unit: return "unit";
     case ClientClass::bare: break;
   }

@@ -13,18 +13,20 @@ namespace palisade {
 
 /// How certain it is that a caller is the application it looks like.
 enum class ClientClass {
-  sandboxed,  ///< the sandbox says so, and the program cannot change what it says
-  unit,       ///< the service manager says so; a program of the same user could have asked for the unit
-  bare        ///< known by its executable only; all bare programs of a user trust each other
+  sandboxed,       ///< the sandbox says so, and the program cannot change what it says
+  unknownSandbox,  ///< in a sandbox that does not say who is inside; known by its executable, and nobody vouches for it
+  unit,            ///< the service manager says so; a program of the same user could have asked for the unit
+  bare             ///< known by its executable only; all bare programs of a user trust each other
 };
 
-/// "sandboxed", "unit", "bare".
+/// "sandboxed", "unknown sandbox", "unit", "bare".
 std::string nameOf(ClientClass clientClass);
 
 class RegisteredClient final : public Client {
  public:
   struct Description {
-    /// What grants are recorded under: the bundle ID, or the executable's path for a program without a record.
+    /// What grants are recorded under: the bundle ID, or the executable's path for a program without a record, behind
+    /// "sandbox:" when it runs in a sandbox that does not say who is inside.
     std::string id;
     std::optional<std::string> bundleID;
     std::string name;
@@ -38,6 +40,10 @@ class RegisteredClient final : public Client {
 
   const std::string& id() const { return _description.id; }
   ClientClass clientClass() const { return _description.clientClass; }
+  /// Whether a sandbox confines it, of whatever kind. Then it manages nothing.
+  bool isInSandbox() const {
+    return _description.clientClass == ClientClass::sandboxed || _description.clientClass == ClientClass::unknownSandbox;
+  }
   const std::vector<std::string>& entitlements() const { return _description.entitlements; }
   const std::string& recordFile() const { return _description.recordFile; }
 

@@ -1,6 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include "Tests/Host/Identity/EnvironmentVariable.h"
 #include "Tests/Host/Identity/Identify.h"
@@ -153,8 +154,67 @@ TEST_F(ASandboxedCaller, OfAnUnknownKindIsRefusedUnlessItsProgramIsTheOneAtItsPa
   EXPECT_THAT(refusal(registry, hidden.pid()), AllOf(HasSubstr("/app"), HasSubstr("container")));
   const CallerProcess posing(sandbox({}, "/usr/bin/env"));
   EXPECT_THAT(refusal(registry, posing.pid()), AllOf(HasSubstr("/usr/bin/env"), HasSubstr("container")));
-  const CallerProcess open(sandbox({}, CALLER_PROGRAM));
-  EXPECT_EQ(identify(registry, open.pid())->id(), CALLER_PROGRAM);
+}
+
+TEST_F(ASandboxedCaller, OfAnUnknownKindIsSandboxedAndKnownByItsProgramInASandbox) {
+  const ClientRegistry registry({});
+  const CallerProcess caller(sandbox({}, CALLER_PROGRAM));
+  const auto client = identify(registry, caller.pid());
+  EXPECT_EQ(client->id(), "sandbox:" CALLER_PROGRAM);
+  EXPECT_EQ(client->bundleID(), std::nullopt);
+  EXPECT_THAT(client->localizedAppName(), testing::EndsWith("identity-caller"));
+  EXPECT_EQ(client->clientClass(), ClientClass::unknownSandbox);
+  EXPECT_TRUE(client->isInSandbox());
+}
+
+TEST_F(ASandboxedCaller, OfAnUnknownKindDoesNotFitTheRecordOfItsProgram) {
+  const auto photos = _folder.copyProgram("photos");
+  _folder.writePhotos(Records::executable(photos));
+  const ClientRegistry registry({_folder.path()});
+  const CallerProcess outside({photos});
+  EXPECT_EQ(identify(registry, outside.pid())->id(), "org.example.photos");
+  const CallerProcess inside({"bwrap", "--die-with-parent", "--dev-bind", "/", "/", "--unshare-user", "--", photos});
+  EXPECT_EQ(identify(registry, inside.pid())->id(), "sandbox:" + photos.string());
+}
+
+TEST_F(ASandboxedCaller, OfAnUnknownKindIsOneInForeignNamespacesOfAnyKind) {
+  const ClientRegistry registry({});
+  const std::string user = geteuid() == 0 ? "" : "--user ";
+  for (const std::string& kind : {std::string("--user"), user + "--mount", user + "--pid --fork --kill-child"}) {
+    std::vector<std::string> words = {"sh", "-c", "exec unshare " + kind + " " CALLER_PROGRAM};
+    const CallerProcess caller(words);
+    EXPECT_EQ(identify(registry, caller.pid())->clientClass(), ClientClass::unknownSandbox) << kind;
+  }
+  // Neither its network nor its name of the machine hides files or processes.
+  for (const std::string& kind : {std::string("--net"), std::string("--uts"), std::string("--ipc")}) {
+    if (geteuid() != 0) continue;
+    const CallerProcess caller({"unshare", kind, CALLER_PROGRAM});
+    EXPECT_EQ(identify(registry, caller.pid())->clientClass(), ClientClass::bare) << kind;
+  }
+}
+
+TEST_F(ASandboxedCaller, IsOneInOtherNamespacesThanTheBusWhateverTheDaemonsAre) {
+  const ClientRegistry registry({});
+  const CallerProcess bus({"bwrap", "--die-with-parent", "--dev-bind", "/", "/", "--unshare-user", "--", CALLER_PROGRAM});
+  const CallerProcess caller({CALLER_PROGRAM});
+  auto connection = connectionOf(caller.pid());
+  connection.busProcess = bus.pid();
+  EXPECT_EQ(registry.identify(connection)->clientClass(), ClientClass::unknownSandbox);
+  connection.process = bus.pid();
+  connection.askProcessAgain = [&] { return bus.pid(); };
+  EXPECT_EQ(registry.identify(connection)->clientClass(), ClientClass::bare);
+}
+
+TEST_F(ASandboxedCaller, CannotBeToldFromOthersWithoutTheBusAndIsRefused) {
+  const ClientRegistry registry({});
+  const CallerProcess caller({CALLER_PROGRAM});
+  CallerProcess gone({CALLER_PROGRAM});
+  auto connection = connectionOf(caller.pid());
+  connection.busProcess = 0;
+  EXPECT_THAT(refusal(registry, connection), HasSubstr("session bus"));
+  connection.busProcess = gone.pid();
+  gone.wait();
+  EXPECT_THAT(refusal(registry, connection), HasSubstr("session bus"));
 }
 
 TEST_F(ASandboxedCaller, OfAnUnknownKindDoesNotFitTheRecordOfTheProgramWhosePathItTakes) {

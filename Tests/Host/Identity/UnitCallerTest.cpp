@@ -48,7 +48,11 @@ class ACallerInAUnit : public testing::Test {
 
   // Starts the program and puts it into a unit of that name.
   pid_t start(const std::filesystem::path& program, const std::string& unit) {
-    _caller = std::make_unique<CallerProcess>(std::vector<std::string>{program});
+    return start(std::vector<std::string>{program}, unit);
+  }
+
+  pid_t start(const std::vector<std::string>& words, const std::string& unit) {
+    _caller = std::make_unique<CallerProcess>(words);
     if (_mayNotMake) {
       coverCgroupsWith("/" + sliceName() + "/" + service + "/" + unit);
     } else {
@@ -132,6 +136,16 @@ TEST_F(ACallerInAUnit, OfSomebodyElseIsRecognisedByItsExecutable) {
   const auto client = identify(registry, start(photos, "app-org.example.Terminal-1.scope"));
   EXPECT_EQ(client->id(), "org.example.photos");
   EXPECT_EQ(client->clientClass(), ClientClass::bare);
+}
+
+TEST_F(ACallerInAUnit, WithNamespacesOfItsOwnIsInASandboxOfAnUnknownKind) {
+  _folder.writePhotos("unit = 'photo-backup.service'");
+  const ClientRegistry registry({_folder.path()});
+  const auto client =
+      identify(registry, start({"bwrap", "--die-with-parent", "--dev-bind", "/", "/", "--unshare-user", "--", CALLER_PROGRAM},
+                               "photo-backup.service"));
+  EXPECT_EQ(client->id(), "sandbox:" CALLER_PROGRAM);
+  EXPECT_EQ(client->bundleID(), std::nullopt);
 }
 
 TEST_F(ACallerInAUnit, OfASnapIsSandboxed) {
