@@ -1,15 +1,14 @@
 #include <gtest/gtest.h>
 #include <sys/prctl.h>
 #include <sys/syscall.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
-#include <array>
 #include <chrono>
 #include <cstdlib>
 #include <exception>
 #include <fstream>
 #include <future>
+#include <iostream>
 #include <iterator>
 #include <string>
 #include <thread>
@@ -36,28 +35,10 @@ void awaitState(pid_t thread, char state) {
   while (!isInState(thread, state)) std::this_thread::yield();
 }
 
-// What a process of its own writes, in which `carryOut` runs.
-std::string answerOf(void (*carryOut)(int answers)) {
-  std::array<int, 2> ends{};
-  if (pipe(ends.data()) != 0) return "no pipe";
-  const pid_t process = fork();
-  if (process == 0) {
-    close(ends[0]);
-    becomeAnOrdinaryUser();
-    carryOut(ends[1]);
-    std::_Exit(4);
-  }
-  close(ends[1]);
-  std::string answer;
-  char next = 0;
-  while (read(ends[0], &next, 1) == 1) answer += next;
-  close(ends[0]);
-  waitpid(process, nullptr, 0);
-  return answer;
-}
-
-[[noreturn]] void answer(int answers, const std::string& text) {
-  std::_Exit(write(answers, text.data(), text.size()) < 0 ? 1 : 0);
+// Ends the process, whichever of its threads this is.
+[[noreturn]] void say(const std::string& sentence) {
+  std::cerr << sentence << std::endl;
+  std::_Exit(0);
 }
 
 std::string waitOf(pid_t thread) {
@@ -68,64 +49,69 @@ std::string waitOf(pid_t thread) {
   }
 }
 
+// In a process of its own, which no other test has started threads in.
+class AThread : public ::testing::Test {
+ protected:
+  void SetUp() override { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
+};
+
 // A process's first thread that has ended before the others keeps its place in /proc, and has given its memory back: what every
 // thread is for a moment when it ends.
-TEST(AnEndingThread, DoesNotWait) {
-  EXPECT_EQ(answerOf([](int answers) {
-              const pid_t first = gettid();
-              std::thread([answers, first] {
-                awaitState(first, 'Z');
-                answer(answers, waitOf(first));
-              }).detach();
-              // Ends this thread alone, without unwinding through the test framework.
-              syscall(SYS_exit, 0);
-            }),
-            "does not wait");
+void askAboutAnEndingThread() {
+  becomeAnOrdinaryUser();
+  const pid_t first = gettid();
+  std::thread([first] {
+    awaitState(first, 'Z');
+    say(waitOf(first));
+  }).detach();
+  // Ends this thread alone, without unwinding through the test framework.
+  syscall(SYS_exit, 0);
 }
 
-TEST(AThreadThatIsGone, DoesNotWait) {
-  EXPECT_EQ(answerOf([](int answers) {
-              std::promise<pid_t> number;
-              std::thread([&] { number.set_value(gettid()); }).join();
-              answer(answers, waitOf(number.get_future().get()));
-            }),
-            "does not wait");
+void askAboutAThreadThatIsGone() {
+  becomeAnOrdinaryUser();
+  std::promise<pid_t> number;
+  std::thread([&] { number.set_value(gettid()); }).join();
+  say(waitOf(number.get_future().get()));
 }
 
-TEST(ASleepingThread, WaitsWhenNothingButAnotherOneCanWakeIt) {
-  EXPECT_EQ(answerOf([](int answers) {
-              std::promise<pid_t> number;
-              std::thread([&] {
-                number.set_value(gettid());
-                std::promise<void>().get_future().wait();
-              }).detach();
-              const pid_t thread = number.get_future().get();
-              awaitState(thread, 'S');
-              answer(answers, waitOf(thread));
-            }),
-            "waits");
+void askAboutASleepingThread(void (*sleep)()) {
+  becomeAnOrdinaryUser();
+  std::promise<pid_t> number;
+  std::thread([&] {
+    number.set_value(gettid());
+    sleep();
+  }).detach();
+  const pid_t thread = number.get_future().get();
+  awaitState(thread, 'S');
+  say(waitOf(thread));
 }
 
-TEST(ASleepingThread, DoesNotWaitWhenItsTimeRunsOut) {
-  EXPECT_EQ(answerOf([](int answers) {
-              std::promise<pid_t> number;
-              std::thread([&] {
-                number.set_value(gettid());
-                std::promise<void>().get_future().wait_for(std::chrono::hours(1));
-              }).detach();
-              const pid_t thread = number.get_future().get();
-              awaitState(thread, 'S');
-              answer(answers, waitOf(thread));
-            }),
-            "does not wait");
+void askInAProcessThatIsClosedToItself() {
+  becomeAnOrdinaryUser();
+  prctl(PR_SET_DUMPABLE, 0);
+  say(waitOf(gettid()));
 }
 
-TEST(AProcessThatMayNotLookAtItself, SaysSo) {
-  EXPECT_EQ(answerOf([](int answers) {
-              prctl(PR_SET_DUMPABLE, 0);
-              answer(answers, waitOf(gettid()));
-            }),
-            "Cannot tell whether a thread waits: /proc/thread-self/syscall cannot be opened: Permission denied.");
+TEST_F(AThread, ThatEndsDoesNotWait) { EXPECT_EXIT(askAboutAnEndingThread(), ::testing::ExitedWithCode(0), "^does not wait"); }
+
+TEST_F(AThread, ThatIsGoneDoesNotWait) {
+  EXPECT_EXIT(askAboutAThreadThatIsGone(), ::testing::ExitedWithCode(0), "^does not wait");
+}
+
+TEST_F(AThread, ThatOnlyAnotherOneCanWakeWaits) {
+  EXPECT_EXIT(askAboutASleepingThread([] { std::promise<void>().get_future().wait(); }), ::testing::ExitedWithCode(0),
+              "^waits");
+}
+
+TEST_F(AThread, WhoseTimeRunsOutDoesNotWait) {
+  EXPECT_EXIT(askAboutASleepingThread([] { std::promise<void>().get_future().wait_for(std::chrono::hours(1)); }),
+              ::testing::ExitedWithCode(0), "^does not wait");
+}
+
+TEST_F(AThread, OfAProcessThatIsClosedToItselfCannotBeToldAbout) {
+  EXPECT_EXIT(askInAProcessThatIsClosedToItself(), ::testing::ExitedWithCode(0),
+              "^Cannot tell whether a thread waits: /proc/thread-self/syscall cannot be opened: Permission denied");
 }
 
 }  // namespace
