@@ -89,7 +89,8 @@ void VXFacebookAccountAccessPlugin::_decideAccessRequest(const std::shared_ptr<c
 
   const std::optional<std::string> audience = _audienceFromOptionsDictionary(options);
   PermissionSet permissions = _permissionsFromOptionsDictionary(options);
-  const std::optional<std::string> appID = _appIDFromOptionsDictionary(options);
+  // Valid options hold an app ID.
+  const std::string appID = _appIDFromOptionsDictionary(options).value();
 
   PermissionSet existingPermissions;
   const auto earlierRecord = store->authorizationManager().authorizationForClient(client, *accountType);
@@ -123,7 +124,7 @@ void VXFacebookAccountAccessPlugin::_decideAccessRequest(const std::shared_ptr<c
                               .userPrompted = true,
                               .elapsedSeconds = 0.0});
     }
-    _handleUserResponse(granted, client, *appID, persistentOptions, account, accountType, existingPermissions, asked, audience,
+    _handleUserResponse(granted, client, appID, persistentOptions, account, accountType, existingPermissions, asked, audience,
                         hadEarlierAuthorization, skipServer, store, completion);
   };
 
@@ -137,22 +138,17 @@ void VXFacebookAccountAccessPlugin::_decideAccessRequest(const std::shared_ptr<c
 // What an earlier grant still covers. Permissions belong to the app that they were granted to. A grant to publish belongs to
 // its audience too, so a request to publish for another audience has to be agreed to again.
 PermissionSet VXFacebookAccountAccessPlugin::_permissionsHeldThrough(const ClientAuthorization& record,
-                                                                     const std::optional<std::string>& appID,
+                                                                     const std::string& appID,
                                                                      const std::optional<std::string>& audience,
                                                                      const PermissionSet& requestedPermissions) const {
-  const Dictionary* earlierOptions = record.options().get();
-  if (earlierOptions == nullptr) return {};
   if (record.grantedPermissions() == nullptr) return {};
-
-  const std::optional<std::string> earlierAppID = _appIDFromOptionsDictionary(earlierOptions);
-  if (!earlierAppID || earlierAppID != appID) return {};
+  const Dictionary* earlierOptions = record.options().get();
+  if (_appIDFromOptionsDictionary(earlierOptions) != appID) return {};
 
   PermissionSet held = *record.grantedPermissions();
-  if (intersects(requestedPermissions, _writePermissions())) {
-    const std::optional<std::string> earlierAudience = _audienceFromOptionsDictionary(earlierOptions);
-    if (!earlierAudience || earlierAudience != audience) {
-      for (const std::string& name : _writePermissions()) held.erase(name);
-    }
+  // A valid request to publish names an audience, so an earlier grant without one differs.
+  if (intersects(requestedPermissions, _writePermissions()) && _audienceFromOptionsDictionary(earlierOptions) != audience) {
+    subtract(held, _writePermissions());
   }
   return held;
 }

@@ -207,7 +207,7 @@ class VXFacebookAccountAccessPlugin : public AccountAccessPlugin {
   void _decideAccessRequest(const std::shared_ptr<const AccountType>& accountType, const std::shared_ptr<const Client>& client,
                             const Dictionary* options, const std::shared_ptr<AccountStore>& store,
                             const AccessCompletion& completion) const;
-  PermissionSet _permissionsHeldThrough(const ClientAuthorization& record, const std::optional<std::string>& appID,
+  PermissionSet _permissionsHeldThrough(const ClientAuthorization& record, const std::string& appID,
                                         const std::optional<std::string>& audience,
                                         const PermissionSet& requestedPermissions) const;
 

@@ -26,7 +26,7 @@ using ::testing::StartsWith;
 const RecordData refusedRecord{.granted = false, .options = persistentOptions()};
 const RecordData grantedEmail{.options = persistentOptions(), .permissions = PermissionSet{"email"}};
 
-const Error droppedCallback =
+const Error refusalForADroppedCallback =
     accountsError(99, "The access decision failed unexpectedly: a service dropped its callback without calling it");
 
 struct SceneWithAnAllowingUser : Scene {
@@ -66,7 +66,7 @@ TEST(AnAnswerThatIsDropped, RefusesTheRequest) {
   SceneWithAnAllowingUser scene;
   scene.platform.social.authorizationAnswers = {{.delivery = Delivery::dropped}};
 
-  EXPECT_THAT(scene.requestAccess(optionsAskingFor({"email"})), isRefusalWith(droppedCallback));
+  EXPECT_THAT(scene.requestAccess(optionsAskingFor({"email"})), isRefusalWith(refusalForADroppedCallback));
 
   EXPECT_EQ(scene.record(), std::nullopt);
   EXPECT_THAT(

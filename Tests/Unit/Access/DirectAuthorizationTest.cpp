@@ -254,7 +254,9 @@ TEST(ADirectAuthorization, IsRefusedWhenTheTokenCannotBeDealtWith) {
   scene.addRecord(refusedForFriends);
   scene.platform.social.authorizationAnswers = {serverGrants({"email"})};
   scene.platform.faults.throwOn("KeychainManager.setCredentialForAccount");
-  EXPECT_THAT(scene.authorize(), isUnexpectedFailureAnswer());
+  const CompletionCall answer = scene.authorize();
+  EXPECT_THAT(answer, isUnexpectedFailureAnswer());
+  EXPECT_THAT(answer.error->description, ::testing::Optional(::testing::HasSubstr("KeychainManager.setCredentialForAccount")));
   EXPECT_EQ(scene.record(), refusedForFriends);
 }
 
