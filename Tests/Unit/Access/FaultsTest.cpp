@@ -229,6 +229,19 @@ TEST(AnExceptionThatIsNoStandardException, IsARefusalLikeAnyOther) {
               isRefusalWith(accountsError(99, "The access decision failed unexpectedly: an exception of an unknown type")));
 }
 
+TEST(AFailureWhileTheServersAnswerIsDealtWith, IsTheReasonThatTheDaemonIsTold) {
+  const std::pair<const char*, Array> cases[] = {{"KeychainManager.setCredentialForAccount", {"email"}},
+                                                 {"JsonParser.parse", {"future"}}};
+  for (const auto& [call, permissions] : cases) {
+    Scene scene;
+    withTheUserAllowing(Delivery::onThread)(scene);
+    scene.platform.faults.throwOn(call);
+    const CompletionCall answer = scene.requestAccess(optionsAskingFor(permissions));
+    ASSERT_THAT(answer, isUnexpectedFailureAnswer()) << call;
+    EXPECT_THAT(answer.error->description, ::testing::Optional(::testing::EndsWith(call)));
+  }
+}
+
 TEST(AFailure, IsLoggedWithTheOperationAndTheReason) {
   Scene scene;
   scene.addAccount();

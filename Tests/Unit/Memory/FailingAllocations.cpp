@@ -12,10 +12,15 @@ std::atomic<std::size_t> allocations = 0;
 std::atomic<std::size_t> firstFailing = 0;
 std::atomic<bool> laterOnesFail = false;
 std::atomic<bool> hasFailed = false;
+std::atomic<void (*)()> nextInterruption = nullptr;
 thread_local int scopes = 0;
 
 bool failsNow() {
   if (scopes == 0) return false;
+  if (void (*interruption)() = nextInterruption.exchange(nullptr)) {
+    const UncountedAllocations uncounted;
+    interruption();
+  }
   const std::size_t number = ++allocations;
   const bool fails = number == firstFailing || (laterOnesFail && firstFailing > 0 && number > firstFailing);
   if (fails) hasFailed = true;
@@ -30,6 +35,8 @@ void planAllocations(const AllocationPlan& plan) {
   laterOnesFail = plan.andAllLater;
   hasFailed = false;
 }
+
+void interruptNextAllocation(void (*interruption)()) { nextInterruption = interruption; }
 
 bool anAllocationFailed() { return hasFailed; }
 

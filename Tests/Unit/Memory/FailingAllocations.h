@@ -19,6 +19,9 @@ struct AllocationPlan {
 /// Starts counting anew.
 void planAllocations(const AllocationPlan& plan);
 
+/// Calls `interruption` inside the next counted allocation, as if another thread came first there.
+void interruptNextAllocation(void (*interruption)());
+
 /// Whether an allocation has failed since the plan was made.
 bool anAllocationFailed();
 
