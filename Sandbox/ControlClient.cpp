@@ -27,7 +27,13 @@ std::string askSandbox(const Options& options) {
   const std::string hint = "Start it with: palisade-sandbox --directory " + options.folder.string();
   if (control.empty()) throw std::runtime_error("No sandbox has run in " + options.folder.string() + ". " + hint);
 
+  std::string secret;
+  if (!(std::ifstream(options.folder / "control-secret") >> secret)) {
+    throw std::runtime_error("The sandbox of " + options.folder.string() + " belongs to somebody else, or is older. " + hint);
+  }
+
   httplib::Client client(control);
+  client.set_bearer_token_auth(secret);
   client.set_ca_cert_path((options.folder / "ca.pem").string());
   const httplib::Result result = ask(client, options);
   if (!result) throw std::runtime_error("The sandbox at " + control + " does not answer. " + hint);

@@ -29,6 +29,7 @@ Each command finds the server through its directory:
   --directory DIRECTORY      (default: $XDG_RUNTIME_DIR/palisade-sandbox, else /tmp/palisade-sandbox-UID)
 
 When the server is ready it prints one line, "ADDRESS CONTROL-ADDRESS CA-FILE", also to be found in DIRECTORY/address.
+DIRECTORY/control-secret lets its reader ask the control server, and is its owner's alone, like everything in DIRECTORY.
 DIRECTORY/master-token holds the token that an account signs its requests with, DIRECTORY/ca.pem the authority to trust.
 Both stay the same from one start to the next; issued tokens are forgotten.
 

@@ -177,8 +177,16 @@ Listener listenAsFacebook(const Authority& authority, CertificateKind kind, int 
   return listen(std::move(server), port);
 }
 
-Listener listenForControl(const Authority& authority, TokenOffice& office, Faults& faults, RequestLog& log) {
+Listener listenForControl(const Authority& authority, const std::string& secret, TokenOffice& office, Faults& faults,
+                          RequestLog& log) {
   auto server = makeServer(authority, CertificateKind::good);
+  server->set_pre_routing_handler([secret](const httplib::Request& request, httplib::Response& response) {
+    if (tokenOf(request) == secret) return httplib::Server::HandlerResponse::Unhandled;
+    fill(response,
+         errorAnswer(403, "forbidden", "Only who may read the file control-secret in the sandbox's directory is served."));
+    response.set_header("Connection", "close");
+    return httplib::Server::HandlerResponse::Handled;
+  });
   server->Get("/tokens", [&office](const auto&, auto& response) { fill(response, office.issued()); });
   server->Get("/requests", [&log](const auto&, auto& response) { fill(response, {.body = log.requests()}); });
   server->Get("/faults", [&faults](const auto&, auto& response) { fill(response, {.body = faults.armed()}); });

@@ -37,6 +37,9 @@ struct Listener {
 Listener listenAsFacebook(const Authority& authority, CertificateKind kind, int port, TokenOffice& office, Faults& faults,
                           RequestLog& log);
 
-Listener listenForControl(const Authority& authority, TokenOffice& office, Faults& faults, RequestLog& log);
+/// Serves whoever presents `secret` as a bearer token: every user of the machine can reach the port, and issued tokens are
+/// shown.
+Listener listenForControl(const Authority& authority, const std::string& secret, TokenOffice& office, Faults& faults,
+                          RequestLog& log);
 
 }  // namespace palisade::sandbox

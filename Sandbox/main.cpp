@@ -71,7 +71,9 @@ void serve(const Options& options) {
   Faults faults;
   RequestLog log;
   const Listener facebook = listenAsFacebook(authority, options.certificate, options.port, office, faults, log);
-  const Listener control = listenForControl(authority, office, faults, log);
+  const std::string secret = randomText(24);
+  replaceFile(folder / "control-secret", secret + "\n");
+  const Listener control = listenForControl(authority, secret, office, faults, log);
 
   const std::string authorityFile = (folder / "ca.pem").string();
   const std::string line = facebook.address() + " " + control.address() + " " + authorityFile + "\n";

@@ -21,6 +21,7 @@ void Sandbox::start(std::vector<std::string> options) {
   line >> _address >> _controlAddress;
   if (_controlAddress.empty()) throw std::runtime_error("the sandbox did not start");
   std::ifstream(_folder.path() / "master-token") >> _masterToken;
+  std::ifstream(_folder.path() / "control-secret") >> _controlSecret;
 }
 
 void Sandbox::stop() {
@@ -38,7 +39,8 @@ HttpClientOptions Sandbox::trusted(HttpClientOptions options) const {
 
 Value Sandbox::control(const std::string& path, std::optional<std::string> form) {
   HttpClient client(trusted({.bodyLimit = 10'000'000}));
-  const HttpAnswer answer = answerOf(ask(client, {.url = _controlAddress + path, .form = std::move(form)}));
+  const HttpAnswer answer =
+      answerOf(ask(client, {.url = _controlAddress + path, .bearerToken = _controlSecret, .form = std::move(form)}));
   EXPECT_EQ(answer.statusCode, 200) << answer.body;
   return NlohmannJsonParser().parse(answer.body, JsonFragments::refused).value.value();
 }

@@ -24,6 +24,7 @@ class Sandbox {
   const std::filesystem::path& folder() const { return _folder.path(); }
   std::filesystem::path authorities() const { return _folder.path() / "ca.pem"; }
   std::filesystem::path log() const { return _folder.path() / "log"; }
+  const std::string& controlAddress() const { return _controlAddress; }
   const std::string& masterToken() const { return _masterToken; }
 
   /// Trusts this sandbox; the other options are the caller's.
@@ -46,6 +47,7 @@ class Sandbox {
   std::optional<ChildProcess> _process;
   std::string _address;
   std::string _controlAddress;
+  std::string _controlSecret;
   std::string _masterToken;
 };
 

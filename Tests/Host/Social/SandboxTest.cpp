@@ -64,6 +64,29 @@ TEST(TheSandbox, ShowsItsTokensAndRequestsAndFailsWhenItIsTold) {
   EXPECT_EQ(answerOf(ask(http, meRequest(sandbox))).statusCode, 401);
 }
 
+TEST(TheSandbox, IsControlledByItsOwnerAlone) {
+  Sandbox sandbox;
+  HttpClient http(sandbox.trusted());
+  for (const auto& secret :
+       {std::optional<std::string>(), std::optional<std::string>("wrong"), std::optional(sandbox.masterToken())}) {
+    for (const char* path : {"/tokens", "/requests", "/faults"}) {
+      const HttpAnswer answer = answerOf(ask(http, {.url = sandbox.controlAddress() + path, .bearerToken = secret}));
+      EXPECT_EQ(answer.statusCode, 403) << path;
+    }
+    for (const char* path : {"/faults", "/calm"}) {
+      const HttpAnswer answer =
+          answerOf(ask(http, {.url = sandbox.controlAddress() + path, .bearerToken = secret, .form = "kind=silent"}));
+      EXPECT_EQ(answer.statusCode, 403) << path;
+    }
+  }
+  EXPECT_EQ(runAt(sandbox, {"faults"}).text, "[]\n");
+  for (const auto& file : std::filesystem::directory_iterator(sandbox.folder())) {
+    if (file.path().filename() == "log") continue;
+    const auto others = std::filesystem::perms::group_all | std::filesystem::perms::others_all;
+    EXPECT_EQ(file.status().permissions() & others, std::filesystem::perms::none) << file.path();
+  }
+}
+
 TEST(TheSandbox, AddsUpWhatAnAppMayDo) {
   Sandbox sandbox;
   HttpClient http(sandbox.trusted());
