@@ -10,8 +10,8 @@
 
 #include "Host/Daemon/AccountDaemon.h"
 #include "Host/Daemon/Paths.h"
-#include "Host/Http/Environment.h"
 #include "Host/Preferences/TomlFile.h"
+#include "Host/Secrets/ProcessEnvironment.h"
 
 namespace {
 
@@ -37,7 +37,7 @@ int main() {
     sigemptyset(&signals);
     sigaddset(&signals, SIGTERM);
     pthread_sigmask(SIG_BLOCK, &signals, nullptr);
-    forgetNetworkEnvironment();
+    keepKnownEnvironment();
 
     DaemonConfiguration configuration;
     if (const auto table = readTomlFile(configurationFile("accountd.toml"))) applyConfigurationFile(*table, configuration);

@@ -13,8 +13,8 @@
 #include "Host/Daemon/AccountDaemon.h"
 #include "Host/Daemon/AtEnd.h"
 #include "Host/Daemon/Paths.h"
-#include "Host/Http/Environment.h"
 #include "Host/Preferences/TomlFile.h"
+#include "Host/Secrets/ProcessEnvironment.h"
 #include "Host/Secrets/ProcessSecrecy.h"
 
 namespace {
@@ -78,6 +78,7 @@ int serve(const palisade::DaemonConfiguration& configuration) {
 
 int main(int argumentCount, char** arguments) {
   try {
+    palisade::keepKnownEnvironment();
     palisade::DaemonConfiguration configuration{.plugins = installedPlugins()};
     if (const auto table = palisade::readTomlFile(palisade::configurationFile("accountd.toml"))) {
       palisade::applyConfigurationFile(*table, configuration);
@@ -88,7 +89,6 @@ int main(int argumentCount, char** arguments) {
       case palisade::CommandLineRequest::serve: break;
     }
     palisade::dropDumpable();
-    palisade::forgetNetworkEnvironment();
     return serve(configuration);
   } catch (const std::exception& failure) {
     std::cerr << "accountd: " << failure.what() << '\n';

@@ -5,9 +5,9 @@
 #include <exception>
 #include <stdexcept>
 
-#include "Host/Http/Environment.h"
 #include "Host/Log/JournalLog.h"
 #include "Host/Preferences/TomlFile.h"
+#include "Host/Secrets/ProcessEnvironment.h"
 #include "Host/Secrets/ProcessSecrecy.h"
 #include "Host/Vantad/Vantad.h"
 
@@ -16,7 +16,6 @@ namespace {
 using namespace palisade;
 
 void serve(VantadOptions options) {
-  forgetNetworkEnvironment();
   dropDumpable();
   if (const auto table = readTomlFile(options.accountdConfiguration)) options.takeDefaultsFrom(*table);
   JournalLog log(options.logLevel.value_or(LogLevel::notice), nullptr);
@@ -37,6 +36,7 @@ int main(int count, char** words) {
   constexpr int failure = 2;
   constexpr int notNeeded = 1;
   try {
+    keepKnownEnvironment();
     run(parseVantadOptions(count, words));
     return EXIT_SUCCESS;
   } catch (const StateIsTaken& error) {

@@ -5,7 +5,9 @@ import collections
 import contextlib
 import os
 import pathlib
+import re
 import resource
+import shutil
 import subprocess
 import time
 import unittest
@@ -340,6 +342,29 @@ class AHostileEnvironment(unittest.TestCase):
                 self.assertNotIn(token, (process / "environ").read_bytes())
             else:
                 self.assertRaises(PermissionError, (process / "environ").read_bytes)
+
+    # What could load code, divert a connection or name another file.
+    STEERING = ("LD_AUDIT", "LD_DEBUG_OUTPUT", "LD_LIBRARY_PATH", "GCONV_PATH", "LOCPATH", "NLSPATH", "GTK_MODULES", "GTK3_MODULES",
+                "GTK_PATH", "GTK_EXE_PREFIX", "GIO_EXTRA_MODULES", "GIO_MODULE_DIR", "GIO_USE_VFS", "GDK_PIXBUF_MODULE_FILE",
+                "GTK_IM_MODULE", "GTK_IM_MODULE_FILE", "https_proxy", "ALL_PROXY", "SSLKEYLOGFILE", "SSL_CERT_FILE", "OPENSSL_CONF",
+                "OPENSSL_MODULES", "CURL_HOME", "HOSTALIASES", "RES_OPTIONS", "MALLOC_TRACE", "TMPDIR", "SQLITE_TMPDIR", "BASH_ENV",
+                "PYTHONPATH", "SYSTEMD_LOG_TARGET", "SECRET_BACKEND", "XDG_DATA_HOMES", "LC")
+
+    def test_leaves_the_daemon_what_it_needs_and_nothing_else(self):
+        with trial.Trial(log="error") as session:
+            module = session.root / "plugins/Spoken/Spoken.so"
+            module.parent.mkdir(parents=True)
+            shutil.copy(trial.BUILD / "Tests/Integration/libpalisade-spoken-environment.so", module)
+            session.configure(plugins=str(session.root / "plugins"))
+            harmless = {"LC_TIME": "C", "TZ": "UTC", "WAYLAND_DISPLAY": "none", "CREDENTIALS_DIRECTORY": str(session.root / "none")}
+            session.start_accountd(environment=harmless | {name: "/nonexistent" for name in self.STEERING})
+            wait_until(lambda: "environment: PATH" in session.daemon_log(), "the module has said what there is")
+            seen = dict(re.findall(r"(?m)^environment: ([^=]*)=(.*)$", session.daemon_log()))
+            self.assertEqual(set(seen) & set(self.STEERING), set())
+            self.assertEqual(seen.pop("PATH"), "/usr/local/bin:/usr/bin:/bin")
+            expected = {name: value for name, value in (session.environment | harmless).items()
+                        if name not in ("PATH", "NO_COLOR") and not name.endswith("SAN_OPTIONS")}
+            self.assertEqual(seen, expected)
 
 
 if __name__ == "__main__":
