@@ -63,8 +63,10 @@ TEST(AFileNameAlone, IsLookedForInTheWorkingDirectory) {
 }
 
 TEST(AModuleThatDoesNotFit, IsRefusedWithTheReason) {
+  const std::string ours = std::to_string(AccountAccessPluginABINumber);
+  const std::string others = std::to_string(AccountAccessPluginABINumber + 6);
   const std::pair<std::string, std::string> cases[] = {
-      {"ofAnotherABI", "it has ABI number 7 and this daemon has 1;"},
+      {"ofAnotherABI", "it has ABI number " + others + " and this daemon has " + ours + ";"},
       {"smaller", "its description of itself has 8 bytes and this daemon needs 24;"},
       {"withoutCreate", "it lacks the function 'create';"},
       {"withoutSupports", "it lacks the function 'supportsAccountTypeWithIdentifier';"},

@@ -54,7 +54,8 @@ class Volume:
         (self._folder / "ballast").unlink()
 
     def remount(self, mode: str) -> None:
-        subprocess.run(["mount", "-o", f"remount,{mode}", str(self._folder)], check=True)
+        # Of the mount alone: in a user namespace, the disk's own options may name users that it does not have.
+        subprocess.run(["mount", "-o", f"remount,bind,{mode}", str(self._folder)], check=True)
 
 
 class ADiskThat(unittest.TestCase):
