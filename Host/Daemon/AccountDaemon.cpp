@@ -94,7 +94,7 @@ class Directory final : public ClientDirectory {
 // In the order of construction: each part may use what stands above it.
 struct AccountDaemon::Parts {
   Parts(const DaemonConfiguration& configuration, SystemAlert* otherAlert)
-      : clients(clientRecordFolders()),
+      : clients(clientRecordFolders(), systemClientRecordFolders()),
         directory(clients),
         store({.path = stateFolder() / "accounts.sqlite", .onChange = [this](const StoreChange& change) { announce(change); }},
               directory),

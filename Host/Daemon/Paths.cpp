@@ -58,4 +58,8 @@ std::vector<std::filesystem::path> clientRecordFolders() {
   return folders;
 }
 
+std::vector<std::filesystem::path> systemClientRecordFolders() {
+  return {"/etc/palisade/clients", "/usr/local/share/palisade/clients", "/usr/share/palisade/clients"};
+}
+
 }  // namespace palisade

@@ -23,4 +23,7 @@ std::filesystem::path configurationFile(const std::string& name);
 /// Client records: the administrator's, the user's own, the system's.
 std::vector<std::filesystem::path> clientRecordFolders();
 
+/// Where a client record can give entitlements, whatever the environment says.
+std::vector<std::filesystem::path> systemClientRecordFolders();
+
 }  // namespace palisade

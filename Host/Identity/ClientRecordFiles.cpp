@@ -6,10 +6,12 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <optional>
 #include <set>
 #include <system_error>
 
 #include "Host/Files/FileDescriptor.h"
+#include "Host/Identity/SystemFolder.h"
 #include "Host/Preferences/TomlFile.h"
 
 // Whoever can write a record that counts can give away entitlements. So the folder and the file are opened first, who owns them
@@ -20,29 +22,39 @@ namespace {
 
 constexpr off_t largestRecord = 64 * 1024;
 
-bool isRootsAlone(const struct stat& status) { return status.st_uid == 0 && (status.st_mode & (S_IWGRP | S_IWOTH)) == 0; }
-
 std::filesystem::path pathOf(const FileDescriptor& file) { return "/proc/self/fd/" + std::to_string(file.number()); }
 
 [[noreturn]] void failToRead() { throw ClientRecordError(std::string("it cannot be read: ") + std::strerror(errno) + "."); }
 
-struct OpenRecord {
-  FileDescriptor file;
-  bool isTrusted;
-};
+// Opens records in one folder: the system's as such, any other as it is.
+class RecordFolder {
+ public:
+  RecordFolder(const std::filesystem::path& path, bool isSystems)
+      : _folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
+    if (isSystems && _folder.isOpen()) _system.emplace(path);
+  }
 
-OpenRecord openRecord(const FileDescriptor& folder, const std::string& name) {
-  constexpr int flags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY;
-  FileDescriptor file(openat(folder.number(), name.c_str(), flags | O_NOFOLLOW));
-  // A link may lead into a folder of somebody else.
-  const bool isLink = !file.isOpen() && errno == ELOOP;
-  if (isLink) file = FileDescriptor(openat(folder.number(), name.c_str(), flags));
-  struct stat status {};
-  if (!file.isOpen() || fstat(file.number(), &status) != 0) failToRead();
-  if (!S_ISREG(status.st_mode)) throw ClientRecordError("it is no regular file.");
-  if (status.st_size > largestRecord) throw ClientRecordError("it is larger than 64 KiB.");
-  return {.file = std::move(file), .isTrusted = !isLink && isRootsAlone(status)};
-}
+  const FileDescriptor& descriptor() const { return _folder; }
+
+  // With what keeps its entitlements from counting.
+  SystemFolder::File openRecord(const std::string& name) const {
+    SystemFolder::File opened = _system ? _system->open(name) : openAsItIs(name);
+    struct stat status {};
+    if (!opened.file.isOpen() || fstat(opened.file.number(), &status) != 0) failToRead();
+    if (!S_ISREG(status.st_mode)) throw ClientRecordError("it is no regular file.");
+    if (status.st_size > largestRecord) throw ClientRecordError("it is larger than 64 KiB.");
+    return opened;
+  }
+
+ private:
+  SystemFolder::File openAsItIs(const std::string& name) const {
+    return {.file = FileDescriptor(openat(_folder.number(), name.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY)),
+            .trouble = "its folder is none of the system's"};
+  }
+
+  FileDescriptor _folder;
+  std::optional<SystemFolder> _system;
+};
 
 Dictionary tableIn(const FileDescriptor& file) {
   const std::string path = pathOf(file);
@@ -59,18 +71,16 @@ Dictionary tableIn(const FileDescriptor& file) {
 
 class Reader {
  public:
-  void readFolder(const std::filesystem::path& path) {
-    const FileDescriptor folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (!folder.isOpen()) {
+  void readFolder(const std::filesystem::path& path, bool isSystems) {
+    const RecordFolder folder(path, isSystems);
+    if (!folder.descriptor().isOpen()) {
       if (errno != ENOENT) tell(path, std::string("it cannot be read: ") + std::strerror(errno) + ".");
       return;
     }
-    struct stat status {};
-    const bool isTrusted = fstat(folder.number(), &status) == 0 && isRootsAlone(status);
     std::set<std::string> decidedHere;
-    for (const std::string& name : namesIn(folder, path)) {
+    for (const std::string& name : namesIn(folder.descriptor(), path)) {
       try {
-        readRecord(folder, isTrusted, path / name, decidedHere);
+        readRecord(folder, path / name, decidedHere);
       } catch (const ClientRecordError& error) {
         tell(path / name, std::string(error.what()) + " The record is left out.");
       }
@@ -94,10 +104,9 @@ class Reader {
     return names;
   }
 
-  void readRecord(const FileDescriptor& folder, bool isFolderTrusted, const std::filesystem::path& path,
-                  std::set<std::string>& decidedHere) {
-    const OpenRecord open = openRecord(folder, path.filename());
-    ClientRecord record = clientRecordFromTable(tableIn(open.file));
+  void readRecord(const RecordFolder& folder, const std::filesystem::path& path, std::set<std::string>& decidedHere) {
+    const SystemFolder::File opened = folder.openRecord(path.filename());
+    ClientRecord record = clientRecordFromTable(tableIn(opened.file));
     record.file = path;
     // A folder that comes later does not speak about what an earlier one has described.
     if (_decided.contains(record.bundleID)) return;
@@ -109,11 +118,11 @@ class Reader {
         throw ClientRecordError(earlier.file.string() + " recognises " + *shared + " already.");
       }
     }
-    if (!record.entitlements.empty() && !(isFolderTrusted && open.isTrusted)) {
+    if (!record.entitlements.empty() && opened.trouble) {
       record.entitlements.clear();
-      tell(path,
-           "its entitlements do not count, because the file and its folder must belong to root, be writable by nobody "
-           "else, and be no links. The rest of the record counts.");
+      tell(path, "its entitlements do not count: " + *opened.trouble +
+                     ". They count in files that root alone can change, below the system's folders. The rest of the record "
+                     "counts.");
     }
     decidedHere.insert(record.bundleID);
     _result.records.push_back(std::move(record));
@@ -129,9 +138,12 @@ class Reader {
 
 }  // namespace
 
-ClientRecords readClientRecords(const std::vector<std::filesystem::path>& folders) {
+ClientRecords readClientRecords(const std::vector<std::filesystem::path>& folders,
+                                const std::vector<std::filesystem::path>& systemFolders) {
   Reader reader;
-  for (const std::filesystem::path& folder : folders) reader.readFolder(folder);
+  for (const std::filesystem::path& folder : folders) {
+    reader.readFolder(folder, std::ranges::find(systemFolders, folder) != systemFolders.end());
+  }
   return reader.take();
 }
 

@@ -19,8 +19,9 @@ struct ClientRecords {
 };
 
 /// Reads `*.toml` in each folder, in the order of the file names. The first folder that describes a bundle ID decides about it.
-/// Entitlements are kept only where the file and its folder belong to root and nobody else can write them. A record that cannot
-/// be read is left out, and so is one that recognises what an earlier one does.
-ClientRecords readClientRecords(const std::vector<std::filesystem::path>& folders);
+/// Entitlements are kept only in files below `systemFolders` that root alone can have put there (see SystemFolder.h). A record
+/// that cannot be read is left out, and so is one that recognises what an earlier one does.
+ClientRecords readClientRecords(const std::vector<std::filesystem::path>& folders,
+                                const std::vector<std::filesystem::path>& systemFolders = {});
 
 }  // namespace palisade

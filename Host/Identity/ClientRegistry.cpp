@@ -151,8 +151,10 @@ struct ClientRegistry::Implementation {
   }
 };
 
-ClientRegistry::ClientRegistry(std::vector<std::filesystem::path> folders)
-    : _implementation(std::make_unique<const Implementation>(Implementation{.content = readClientRecords(folders)})) {}
+ClientRegistry::ClientRegistry(const std::vector<std::filesystem::path>& folders,
+                               const std::vector<std::filesystem::path>& systemFolders)
+    : _implementation(
+          std::make_unique<const Implementation>(Implementation{.content = readClientRecords(folders, systemFolders)})) {}
 
 ClientRegistry::~ClientRegistry() = default;
 

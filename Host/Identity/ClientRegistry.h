@@ -6,7 +6,7 @@
 /// (see ConnectionOwner.h) and this user's. Only then /proc is read, in this order: the Flatpak instance file, the snap's
 /// security label or cgroup, the systemd unit, the executable. The first that says something decides. Client records (one TOML
 /// file an application, see ClientRecord.h) give the application a bundle ID, a name, and entitlements; entitlements count only
-/// from files that belong to root and that nobody else can write.
+/// from files below the system's folders that root alone can change.
 ///
 /// Whoever has other namespaces of users, mounts or processes than the process that holds the bus is in a sandbox too. When no
 /// information that is known here says who it is, no record fits it: it is known by the path of its executable behind
@@ -35,7 +35,9 @@ class ClientRegistry {
  public:
   /// Records are read from `*.toml` in the folders, once; the first folder that has a bundle ID wins. A record that cannot be
   /// read is left out and told in `troubles`.
-  explicit ClientRegistry(std::vector<std::filesystem::path> folders);
+  /// Entitlements count below those of the folders that are the system's.
+  explicit ClientRegistry(const std::vector<std::filesystem::path>& folders,
+                          const std::vector<std::filesystem::path>& systemFolders = {});
   ~ClientRegistry();
 
   ClientRegistry(const ClientRegistry&) = delete;

@@ -1,6 +1,7 @@
 // Identifies callers from another user's account, and from a PID namespace of its own.
 //
 //     identity-trial identify PID    prints the caller's ID, or "refused: " and why
+//     identity-trial folder PATH     prints why a folder is none of the system's
 //     identity-trial reuse COUNT     as the first process of a PID namespace: replaces a caller by another process of the same
 //                                    number while it is being identified; prints how often that came about, and how often the
 //                                    caller was refused
@@ -14,6 +15,7 @@
 #include <iostream>
 #include <string_view>
 
+#include "Host/Identity/SystemFolder.h"
 #include "Tests/Host/Identity/Identify.h"
 
 namespace {
@@ -70,6 +72,10 @@ int reuse(int count) {
 int main(int count, char** words) {
   if (count != 3) return 2;
   const std::string_view what = words[1];
+  if (what == "folder") {
+    std::cout << palisade::SystemFolder(words[2]).trouble().value_or("the system's") << '\n';
+    return 0;
+  }
   const int number = std::atoi(words[2]);
   if (what == "identify") return tell(number);
   return what == "reuse" ? reuse(number) : 2;
