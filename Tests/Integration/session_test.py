@@ -80,7 +80,7 @@ class AnAlert(unittest.TestCase):
         output = session(ADD_ACCOUNT + f"{ASK} & asking=$!\n" + WHEN_ASKED +
                          "palisade revoke org.example.photos; wait $asking; echo \"status $?\"; palisade grants", answer="nothing")
         self.assertIn("status 1", output)
-        self.assertIn("Nobody answered.", output)
+        self.assertIn("taken back while this request waited", output)
         self.assertIn("No application has asked yet.", output)
 
     def test_delays_nobody_else(self):
