@@ -12,6 +12,8 @@
 #include <system_error>
 #include <utility>
 
+#include "Host/Secrets/Wipe.h"
+
 namespace palisade {
 namespace {
 
@@ -144,6 +146,7 @@ void BusLoop::carryOut(const std::function<void()>& work) {
   } catch (const std::exception& failure) {
     _onTrouble(std::string("What a call asked for was cut short: ") + failure.what());
   }
+  wipeDeadStack();
 }
 
 void BusLoop::waitForMessages() {

@@ -33,6 +33,7 @@
 #include "Host/Preferences/TomlFile.h"
 #include "Host/Preferences/TomlPreferencesStore.h"
 #include "Host/Queue/ThreadSerialQueue.h"
+#include "Host/Secrets/Wipe.h"
 #include "Host/Social/HttpSocialFramework.h"
 #include "Host/Strings/LanguagePreference.h"
 #include "Host/Vantad/Outbox.h"
@@ -151,6 +152,7 @@ struct AccountDaemon::Parts {
     // It waits for the Secret Service, and nobody waits for it.
     tidying = std::jthread([this] {
       for (const std::string& sentence : keychain.tidy()) tell(sentence);
+      wipeDeadStack();
     });
   }
 

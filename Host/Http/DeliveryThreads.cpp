@@ -4,6 +4,7 @@
 #include <utility>
 
 #include "Host/Http/QuietThread.h"
+#include "Host/Secrets/Wipe.h"
 
 namespace palisade {
 
@@ -52,6 +53,7 @@ void DeliveryThreads::run() {
     lock.unlock();
     work();
     work = nullptr;  // what the work owned goes before the lock is taken again
+    wipeDeadStack();
     lock.lock();
   }
 }

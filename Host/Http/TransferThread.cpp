@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "Host/Http/QuietThread.h"
+#include "Host/Secrets/Wipe.h"
 
 namespace palisade {
 namespace {
@@ -78,6 +79,7 @@ void TransferThread::run() {
     int stillRunning = 0;
     _curl->multiPerform(_multi, &stillRunning);
     settleFinished();
+    wipeDeadStack();
     // Returns at once for a transfer that starts afresh.
     _curl->multiPoll(_multi, nullptr, 0, untilSomethingHappens, nullptr);
   }

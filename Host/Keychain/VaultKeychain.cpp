@@ -57,7 +57,9 @@ std::vector<std::string> VaultKeychain::clientIDsWithCredentials(const std::shar
 
 std::string VaultKeychain::description() {
   const std::string vault = "encrypted vault " + _vault->store.path().string();
-  const std::optional<VaultKey> key = _vault->store.newestKey();
+  std::optional<VaultKey> key;
+  // What is wrong with the store is said elsewhere.
+  if (keychainAnswer([&] { key = _vault->store.newestKey(); })) return vault;
   if (!key) return vault + ", empty";
   if (key->hasHalfInService) {
     return vault +

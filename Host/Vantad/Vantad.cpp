@@ -15,6 +15,7 @@
 #include "Host/Accounts/StoredAccount.h"
 #include "Host/Keychain/VaultKeychain.h"
 #include "Host/Preferences/TomlFile.h"
+#include "Host/Secrets/Wipe.h"
 #include "Host/Vantad/Departures.h"
 #include "Platform/Log.h"
 
@@ -93,6 +94,7 @@ Vantad::Reason Vantad::serve(const ServerConfiguration& configuration) {
                    .random = [&generator] { return std::generate_canonical<double, 32>(generator); }});
   while (true) {
     const auto wait = advance(courier);
+    wipeDeadStack();
     std::array<pollfd, 6> events = {{{.fd = _signals, .events = POLLIN, .revents = 0},
                                      {.fd = _configurationFile.descriptor(), .events = POLLIN, .revents = 0},
                                      {.fd = _network.descriptor(), .events = POLLIN, .revents = 0},

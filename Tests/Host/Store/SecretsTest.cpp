@@ -1,3 +1,4 @@
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/prctl.h>
@@ -5,7 +6,9 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 #include <fstream>
@@ -51,6 +54,30 @@ TEST(Wiping, LeavesZerosInMemory) {
   std::array<char, 8> memory{'s', 'e', 'c', 'r', 'e', 't', '!', '!'};
   wipe(memory.data(), 7);
   EXPECT_EQ(memory, (std::array<char, 8>{0, 0, 0, 0, 0, 0, 0, '!'}));
+}
+
+// Leaves a secret behind in its frame, and says where.
+[[gnu::noinline]] std::uintptr_t keepASecretOnTheStack() {
+  volatile char frame[64 * 1024];
+  for (volatile char& character : frame) character = 's';
+  return reinterpret_cast<std::uintptr_t>(&frame[0]);
+}
+
+// How often the secret's character stands there, by a way that the compiler does not see.
+std::ptrdiff_t secretsAt(std::uintptr_t place) {
+  static std::array<char, 64 * 1024> content;
+  const int memory = open("/proc/self/mem", O_RDONLY | O_CLOEXEC);
+  const ssize_t size = pread(memory, content.data(), content.size(), static_cast<off_t>(place));
+  close(memory);
+  EXPECT_EQ(size, static_cast<ssize_t>(content.size()));
+  return std::ranges::count(content, 's');
+}
+
+TEST(Wiping, ReachesWhatFunctionsHaveLeftOnTheStack) {
+  const std::uintptr_t place = keepASecretOnTheStack();
+  EXPECT_GT(secretsAt(place), 32 * 1024) << "there is something to be wiped";
+  wipeDeadStack();
+  EXPECT_LT(secretsAt(place), 16) << "but for what has been called since";
 }
 
 TEST(Wiping, EmptiesATextAndWhatItHeldBefore) {
