@@ -35,18 +35,26 @@ bool isPrintable(std::string_view text) {
   return std::none_of(text.begin(), text.end(), [](unsigned char byte) { return byte < 0x20 || byte == 0x7F; });
 }
 
+char lowerCase(char character) {
+  return character >= 'A' && character <= 'Z' ? static_cast<char>(character - 'A' + 'a') : character;
+}
+
 std::string inLowerCase(std::string_view text) {
   std::string lowered(text);
-  std::transform(lowered.begin(), lowered.end(), lowered.begin(), [](char character) {
-    return character >= 'A' && character <= 'Z' ? static_cast<char>(character - 'A' + 'a') : character;
-  });
+  std::transform(lowered.begin(), lowered.end(), lowered.begin(), lowerCase);
   return lowered;
 }
 
-std::string withoutBlanks(std::string_view text) {
+// `word` is in lower case. It takes no memory: the library's callbacks must not throw.
+bool isSameWord(std::string_view text, std::string_view word) {
+  return std::equal(text.begin(), text.end(), word.begin(), word.end(),
+                    [](char one, char other) { return lowerCase(one) == other; });
+}
+
+std::string_view withoutBlanks(std::string_view text) {
   const std::size_t first = text.find_first_not_of(" \t\r\n");
   if (first == std::string_view::npos) return {};
-  return std::string(text.substr(first, text.find_last_not_of(" \t\r\n") - first + 1));
+  return text.substr(first, text.find_last_not_of(" \t\r\n") - first + 1);
 }
 
 }  // namespace
@@ -147,7 +155,13 @@ std::size_t CurlTransfer::takeBody(char* bytes, std::size_t size, std::size_t co
   const std::size_t length = size * count;
   self._tooLarge = length > self._options.bodyLimit - self._body.size();
   if (self._tooLarge) return 0;
-  self._body.append(bytes, length);
+  // An exception must not pass through the library, which is written in C.
+  try {
+    self._body.append(bytes, length);
+  } catch (const std::bad_alloc&) {
+    self._outOfMemory = true;
+    return 0;
+  }
   return length;
 }
 
@@ -162,8 +176,8 @@ std::size_t CurlTransfer::takeHeader(char* bytes, std::size_t size, std::size_t 
   if (line.starts_with("HTTP/")) self._headIsComplete = false;
   if (line == "\r\n" || line == "\n") self._headIsComplete = true;
   const std::size_t colon = line.find(':');
-  if (colon != std::string_view::npos && inLowerCase(line.substr(0, colon)) == "content-encoding") {
-    self._encoded = inLowerCase(withoutBlanks(line.substr(colon + 1))) != "identity";
+  if (colon != std::string_view::npos && isSameWord(line.substr(0, colon), "content-encoding")) {
+    self._encoded = !isSameWord(withoutBlanks(line.substr(colon + 1)), "identity");
     if (self._encoded) return 0;
   }
   return length;
@@ -225,6 +239,9 @@ Error CurlTransfer::failure(CURLcode code) const {
   if (_tooLarge || code == CURLE_FILESIZE_EXCEEDED) {
     return httpError(HttpErrorTooLarge,
                      server() + " sent more than " + std::to_string(_options.bodyLimit) + " bytes; the answer was dropped.");
+  }
+  if (_outOfMemory || code == CURLE_OUT_OF_MEMORY) {
+    return httpError(HttpErrorUnavailable, "There is no memory left for the server's answer.");
   }
   if (_encoded) return httpError(HttpErrorMalformed, server() + " sent a compressed answer, which nobody asked for.");
   switch (code) {

@@ -58,6 +58,7 @@ class CurlTransfer {
   bool _mustStartAfresh = false;
   bool _headIsComplete = false;
   bool _tooLarge = false;
+  bool _outOfMemory = false;
   bool _encoded = false;
 };
 

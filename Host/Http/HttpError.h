@@ -25,7 +25,7 @@ enum HttpErrorCode : int {
   HttpErrorCancelled = 7,       ///< whoever sent the request gave it up, or the client is shutting down
   HttpErrorMalformed = 8,       ///< the answer is not HTTP, or is encoded in a way that nobody asked for
   HttpErrorInvalidRequest = 9,  ///< the address is no HTTPS address, or the token cannot stand in a header
-  HttpErrorUnavailable = 10,    ///< this machine cannot send requests: no HTTP library, or no server configured
+  HttpErrorUnavailable = 10,    ///< this machine cannot send requests: no HTTP library, no server configured, or no memory
   HttpErrorStatus = 11,         ///< the server answered that it will not or cannot do it
 };
 
