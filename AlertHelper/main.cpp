@@ -12,6 +12,7 @@
 #include <cstdio>
 
 #include "AlertHelper/AlertWindow.h"
+#include "AlertHelper/DisplayOwner.h"
 #include "AlertHelper/HostConnection.h"
 
 namespace {
@@ -53,6 +54,10 @@ int main(int argumentCount, char** arguments) {
   g_set_prgname("palisade-alert");
   if (gtk_init_check(&argumentCount, &arguments) == FALSE) {
     std::fputs("palisade-alert: the display cannot be used.\n", stderr);
+    return noDisplay;
+  }
+  if (!palisade::isTrustedDisplay(gdk_display_get_default(), question->networkDisplay)) {
+    std::fputs("palisade-alert: the display belongs to another user, or is reached over the network.\n", stderr);
     return noDisplay;
   }
   Gtk::Main::init_gtkmm_internals();

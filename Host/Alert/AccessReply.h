@@ -1,8 +1,10 @@
 #pragma once
 
-/// What a portal's reply means. Everything that decides between consent and refusal is here.
+/// What a portal's reply means. Everything that decides whether it is consent is here.
 ///
-/// Threads: a pure function. Errors: whatever is not plainly the user's answer is nobody's.
+/// Where the keyboard stands in a portal's dialog, and when its keys press a button, is the backend's choice: a key that was
+/// meant for another window may have refused. So a refusal there is nobody's answer: the request fails, and nothing is
+/// remembered. Threads: a pure function. Errors: whatever is not plainly consent is nobody's answer.
 
 #include <chrono>
 #include <cstdint>
@@ -22,8 +24,8 @@ struct AccessReply {
 /// Nobody reads a question and decides in less.
 inline constexpr std::chrono::milliseconds soonestConsent(500);
 
-/// 0 is consent, unless it came sooner than a person could have read the question; 1 is the user's refusal. Every other word,
-/// and no reply, is nobody's answer.
+/// 0 is consent, unless it came sooner than a person could have read the question. Every other word, and no reply, is nobody's
+/// answer.
 AlertResponse responseOfReply(const std::optional<AccessReply>& reply);
 
 }  // namespace palisade

@@ -59,9 +59,10 @@ std::optional<AlertSubject> subjectIn(const Dictionary& object) {
 }  // namespace
 
 std::optional<std::string> alertQuestionFrame(const AlertQuestion& question) {
-  Dictionary object{{"nonce", hexadecimal(question.nonce)}, {"title", question.title},      {"message", question.message},
-                    {"refuse", question.refuseTitle},       {"allow", question.allowTitle}, {"languages", question.languages},
-                    {"topmost", question.topMost}};
+  Dictionary object{{"nonce", hexadecimal(question.nonce)}, {"title", question.title},
+                    {"message", question.message},          {"refuse", question.refuseTitle},
+                    {"allow", question.allowTitle},         {"languages", question.languages},
+                    {"topmost", question.topMost},          {"display", question.networkDisplay}};
   if (question.subject) {
     const AlertSubject& subject = *question.subject;
     object.set("subject", Dictionary{{"name", subject.applicationName},
@@ -96,7 +97,8 @@ std::optional<AlertQuestion> alertQuestionFromJson(std::string_view json) {
   const Value* topMost = object->find("topmost");
   if (!nonce || topMost == nullptr || topMost->boolean() == nullptr || !read(*object, "title", question.title) ||
       !read(*object, "message", question.message) || !read(*object, "refuse", question.refuseTitle) ||
-      !read(*object, "allow", question.allowTitle) || !read(*object, "languages", question.languages)) {
+      !read(*object, "allow", question.allowTitle) || !read(*object, "languages", question.languages) ||
+      !read(*object, "display", question.networkDisplay)) {
     return std::nullopt;
   }
   question.nonce = *nonce;

@@ -38,6 +38,8 @@ struct AlertQuestion {
   /// Catalogue names of the user's languages, best first, separated by colons.
   std::string languages;
   bool topMost = false;
+  /// The display that may be reached over the network; empty for none.
+  std::string networkDisplay = {};
   AlertNonce nonce{};
 };
 

@@ -31,6 +31,7 @@ bool DesktopAlert::isInstalled() const { return access(_options.helper.c_str(), 
 std::shared_ptr<AlertHandle> DesktopAlert::createAlert(AlertAllocator, double, unsigned, int* errorPlace,
                                                        const AlertDescription& description) {
   AlertQuestion question = askedQuestion(description, _options.subject(), _options.languages());
+  question.networkDisplay = _options.networkDisplay;
   question.nonce = freshNonce();
   const auto frame = alertQuestionFrame(question);
   auto helper = frame ? HelperProcess::start(_options.helper, *frame) : nullptr;

@@ -25,6 +25,8 @@ class DesktopAlert final : public SystemAlert {
     std::function<std::optional<AlertSubject>()> subject = [] { return std::nullopt; };
     /// Catalogue names, best first, separated by colons; called in `createAlert`.
     std::function<std::string()> languages = [] { return std::string("en"); };
+    /// The display that may be reached over the network; empty for none.
+    std::string networkDisplay = {};
   };
 
   explicit DesktopAlert(Options options) : _options(std::move(options)) {}

@@ -5,9 +5,9 @@
 /// Threads: as `SystemAlert` says; `takeDown`, `backend` and `trouble` may be called from any thread. Ownership: a handle owns
 /// its dialog, which does not outlive it. Only a daemon that is killed leaves its dialog behind, and nobody hears what is
 /// answered there. Errors: without a backend that can be asked no alert is created, and the answer is nobody's, as it is when
-/// the backend fails, leaves the bus, is replaced, or replies anything but the user's answer. Consent that comes within half a
-/// second of the question is nobody's too: no person has read it. Whether the dialog stands above all other windows is the
-/// backend's choice.
+/// the backend fails, leaves the bus, is replaced, or replies anything but consent, a refusal included (see `responseOfReply`).
+/// Consent that comes within half a second of the question is nobody's too: no person has read it. Whether the dialog stands
+/// above all other windows is the backend's choice.
 
 #include <functional>
 #include <memory>

@@ -74,13 +74,10 @@ bool SessionAlert::isUsable(AlertFrontEnd frontEnd) const {
   return true;
 }
 
-// GNOME's shell shows the portal's dialogs itself.
-bool SessionAlert::prefersPortal() const { return std::ranges::count(currentDesktops(), "gnome") > 0 || !_keepsWindowsOnTop(); }
-
 AlertFrontEnd SessionAlert::frontEnd() const {
   if (_choice && isUsable(*_choice)) return *_choice;
   std::array candidates = {AlertFrontEnd::desktop, AlertFrontEnd::portal, AlertFrontEnd::terminal};
-  if (prefersPortal()) std::swap(candidates[0], candidates[1]);
+  if (!_keepsWindowsOnTop()) std::swap(candidates[0], candidates[1]);
   for (const AlertFrontEnd candidate : candidates) {
     if (isUsable(candidate)) return candidate;
   }

@@ -2,12 +2,12 @@
 
 /// The system alert of a session: asks wherever the user can be asked at that moment.
 ///
-/// The front end is chosen for each alert: the configured one first, then whatever can keep the alert above other windows: the
-/// helper's window, or the portal's dialog on GNOME, which shows it above everything, and where no window can be kept on top.
-/// The other of the two is next, then the terminal. When none of them can be used, nobody is asked. An alert that is to go when
-/// the session locks is taken down then, whatever shows it, and `receiveResponse` returns ECANCELED. Threads: as `SystemAlert`
-/// says; `takeDown`, `frontEnd` and `trouble` may be called from any thread. Ownership: a handle owns what shows it. Errors: an
-/// alert that no front end can show is a null handle, and nobody's answer.
+/// The front end is chosen for each alert: the configured one first, then the helper's window wherever it can be kept above
+/// other windows, and the portal's dialog where it cannot, as on GNOME's Wayland. The other of the two is next, then the
+/// terminal. When none of them can be used, nobody is asked. An alert that is to go when the session locks is taken down then,
+/// whatever shows it, and `receiveResponse` returns ECANCELED. Threads: as `SystemAlert` says; `takeDown`, `frontEnd` and
+/// `trouble` may be called from any thread. Ownership: a handle owns what shows it. Errors: an alert that no front end can show
+/// is a null handle, and nobody's answer.
 
 #include <functional>
 #include <memory>
@@ -37,7 +37,7 @@ class SessionAlert final : public SystemAlert {
     std::optional<std::string> terminal = std::nullopt;
     DesktopAlert::Options desktop;
     PortalAlert::Options portal = {};
-    std::function<bool()> hasUsableDisplay = palisade::hasUsableDisplay;
+    std::function<bool()> hasUsableDisplay = [] { return palisade::hasUsableDisplay(); };
     std::function<bool()> keepsWindowsOnTop = palisade::keepsWindowsOnTop;
     /// Calls its argument, from any thread, when the session locks, as long as the result lives. May throw when locks cannot be
     /// heard of; the alert then stands through them.
@@ -65,7 +65,6 @@ class SessionAlert final : public SystemAlert {
 
  private:
   bool isUsable(AlertFrontEnd frontEnd) const;
-  bool prefersPortal() const;
   SystemAlert& showing(AlertFrontEnd frontEnd);
 
   std::optional<AlertFrontEnd> _choice;

@@ -13,6 +13,7 @@ called; see com.veltran.Accounts1 there, and palisade(1) for people.
   --plugins DIRECTORY   load the plug-ins in this folder
   --alert FRONT-END     desktop, portal, terminal or nobody; otherwise whatever the session has
   --terminal TTY        ask the user on this terminal, such as the one that `tty` prints
+  --display NAME        the X display that may be reached over the network, such as localhost:10.0; otherwise none
   --keychain CHOICE     automatic, secret-service or vault
   --log LEVEL           error, notice or debug
   -h, --help            show this
@@ -52,6 +53,8 @@ void apply(std::string_view name, const std::string& value, DaemonConfiguration&
     configuration.alert = alertFrontEnd(value);
   } else if (name == "terminal") {
     configuration.terminal = value;
+  } else if (name == "display") {
+    configuration.display = value;
   } else if (name == "keychain") {
     configuration.keychain = keychainChoice(value);
   } else if (name == "log") {

@@ -22,12 +22,14 @@ struct DaemonConfiguration {
   std::optional<AlertFrontEnd> alert = std::nullopt;
   /// The terminal on which to ask; none asks on none.
   std::optional<std::string> terminal = std::nullopt;
+  /// The display that may be reached over the network; none is.
+  std::optional<std::string> display = std::nullopt;
   KeychainChoice keychain = KeychainChoice::automatic;
   LogLevel logLevel = LogLevel::notice;
   AlertCoolDown::Limits coolDown = {};
 };
 
-/// `table` is accountd.toml's: plugins, alert (desktop, portal, terminal, nobody), terminal, keychain (automatic,
+/// `table` is accountd.toml's: plugins, alert (desktop, portal, terminal, nobody), terminal, display, keychain (automatic,
 /// secret-service, vault), log (error, notice, debug), and the numbers cool_down_after_refusals and cool_down_minutes.
 void applyConfigurationFile(const Dictionary& table, DaemonConfiguration& configuration);
 

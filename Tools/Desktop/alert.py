@@ -16,6 +16,7 @@ EXAMPLE = {
     "allow": "Allow",
     "languages": "en",
     "topmost": True,
+    "display": "",
     "subject": {"name": "Photos", "id": "org.example.photos", "identity": "certain", "account": "ada@example.org"},
 }
 

@@ -19,6 +19,7 @@ AlertQuestion example() {
                                   .account = "ada"},
           .languages = "de:en",
           .topMost = true,
+          .networkDisplay = "localhost:10.0",
           .nonce = freshNonce()};
 }
 
@@ -37,6 +38,7 @@ TEST(AQuestion, ComesBackWhole) {
   EXPECT_EQ(read->allowTitle, question.allowTitle);
   EXPECT_EQ(read->languages, question.languages);
   EXPECT_EQ(read->topMost, question.topMost);
+  EXPECT_EQ(read->networkDisplay, question.networkDisplay);
   EXPECT_EQ(read->nonce, question.nonce);
   ASSERT_TRUE(read->subject);
   EXPECT_EQ(read->subject->applicationName, "Photos");
@@ -62,7 +64,8 @@ TEST(AQuestionThatIsCutOff, IsNone) {
 
 TEST(AQuestionWithAMemberOfAnotherType, IsNone) {
   const std::string json = alertQuestionFrame(example()).value().substr(4);
-  for (const char* member : {"nonce", "title", "message", "refuse", "allow", "languages", "topmost", "subject", "name"}) {
+  for (const char* member :
+       {"nonce", "title", "message", "refuse", "allow", "languages", "topmost", "display", "subject", "name"}) {
     std::string broken = json;
     broken.replace(broken.find("\"" + std::string(member) + "\"") + 1, 1, "X");
     const auto read = alertQuestionFromJson(broken);

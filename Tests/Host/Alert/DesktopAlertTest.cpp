@@ -45,7 +45,7 @@ TEST(ADesktopAlert, IsNobodysAnswerHoweverElseTheHelperEnds) {
   const std::vector<std::string> endings = {
       "close",        "exit 0",        "exit 1",       "foreign",         "allow exit 1",  "allow exit 255",
       "allow allow",  "refuse allow",  "allow refuse", "text consent",    "allow text !",  "foreign allow",
-      "text ! allow", "refuse exit 1", "close allow",  "foreign foreign", "allow foreign", "prefix 47 text !"};
+      "text ! allow", "refuse exit 1", "close allow",  "foreign foreign", "allow foreign", "prefix 40 text 12345678"};
   for (const std::string& ending : endings) EXPECT_EQ(responseTo(ending), AlertResponseNobody) << ending;
 }
 

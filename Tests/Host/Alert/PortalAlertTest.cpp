@@ -19,8 +19,8 @@ TEST(AReply, IsConsentOnlyIfItIsZeroAndAPersonCouldHaveReadTheQuestion) {
   for (const Row& row :
        {Row{0, milliseconds(500), AlertResponseDefaultButton}, Row{0, milliseconds(499), AlertResponseNobody},
         Row{0, milliseconds(0), AlertResponseNobody}, Row{0, milliseconds(-1), AlertResponseNobody},
-        Row{0, std::chrono::hours(24), AlertResponseDefaultButton}, Row{1, milliseconds(0), AlertResponseAlternateButton},
-        Row{1, milliseconds(5000), AlertResponseAlternateButton}, Row{2, milliseconds(5000), AlertResponseNobody},
+        Row{0, std::chrono::hours(24), AlertResponseDefaultButton}, Row{1, milliseconds(0), AlertResponseNobody},
+        Row{1, milliseconds(5000), AlertResponseNobody}, Row{2, milliseconds(5000), AlertResponseNobody},
         Row{3, milliseconds(5000), AlertResponseNobody}, Row{256, milliseconds(5000), AlertResponseNobody},
         Row{UINT32_MAX, milliseconds(5000), AlertResponseNobody}}) {
     const AccessReply reply{.response = row.response, .after = row.after};
@@ -138,7 +138,7 @@ TEST_F(APortalAlert, HasNoMarkupFormatsKeysOrLinesButItsOwn) {
 
 TEST_F(APortalAlert, PassesOnWhatTheReplyMeans) {
   for (const auto& [word, expected] : {std::pair<std::uint32_t, AlertResponse>{0, AlertResponseDefaultButton},
-                                       {1, AlertResponseAlternateButton},
+                                       {1, AlertResponseNobody},
                                        {2, AlertResponseNobody}}) {
     _conversation.reply = AccessReply{.response = word, .after = std::chrono::seconds(1)};
     AlertResponse response = 42;

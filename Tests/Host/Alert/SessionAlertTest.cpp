@@ -3,16 +3,20 @@
 #include "Host/Alert/SessionAlert.h"
 
 #include <gmock/gmock.h>
+#include <netinet/in.h>
 #include <stdlib.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <cstddef>
 #include <cstring>
+#include <filesystem>
 #include <optional>
 
 #include "Tests/Host/Alert/PseudoTerminal.h"
 #include "Tests/Host/Identity/EnvironmentVariable.h"
+#include "Tests/Host/OwnRoot.h"
 #include "Tests/Host/TemporaryFolder.h"
 
 namespace palisade {
@@ -64,7 +68,9 @@ INSTANTIATE_TEST_SUITE_P(
         Situation{"TheTerminalChosenWithoutOne", FrontEnd::terminal, true, false, FrontEnd::desktop, true},
         Situation{"NobodyChosen", FrontEnd::nobody, true, true, FrontEnd::nobody, false},
         Situation{"APortalBesideADisplay", std::nullopt, true, false, FrontEnd::desktop, false, true},
-        Situation{"APortalOnGnome", std::nullopt, true, false, FrontEnd::portal, false, true, true, "ubuntu:GNOME"},
+        Situation{"APortalOnGnome", std::nullopt, true, false, FrontEnd::desktop, false, true, true, "ubuntu:GNOME"},
+        Situation{"APortalOnGnomeWithoutLayers", std::nullopt, true, false, FrontEnd::portal, false, true, false,
+                  "ubuntu:GNOME"},
         Situation{"APortalWhereNothingStaysOnTop", std::nullopt, true, false, FrontEnd::portal, false, true, false},
         Situation{"NoPortalWhereNothingStaysOnTop", std::nullopt, true, false, FrontEnd::desktop, false, false, false},
         Situation{"NoPortalOnGnome", std::nullopt, true, false, FrontEnd::desktop, false, false, true, "GNOME"},
@@ -225,6 +231,87 @@ TEST(ADisplay, IsUsableWhenItsServerTakesConnections) {
   EXPECT_TRUE(hasUsableDisplay());
   EXPECT_FALSE(keepsWindowsOnTop()) << "its compositor says nothing";
   close(server);
+}
+
+// A socket on which somebody takes connections: of this user, or of whoever `user` is.
+class Listener {
+ public:
+  Listener(const std::string& path, uid_t user) : _socket(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    std::memcpy(address.sun_path, path.data(), path.size());
+    const auto size = static_cast<socklen_t>(offsetof(sockaddr_un, sun_path) + path.size());
+    const bool isBound = bind(_socket, reinterpret_cast<const sockaddr*>(&address), size) == 0;
+    // Whoever listens is the one whom the kernel names.
+    const uid_t self = geteuid();
+    if (seteuid(user) == 0) _listens = isBound && listen(_socket, 4) == 0;
+    _listens = seteuid(self) == 0 && _listens;
+  }
+  Listener(const Listener&) = delete;
+  Listener& operator=(const Listener&) = delete;
+  ~Listener() { close(_socket); }
+
+  bool listens() const { return _listens; }
+
+ private:
+  int _socket;
+  bool _listens = false;
+};
+
+constexpr uid_t root = 0;
+constexpr uid_t somebodyElse = 1;
+
+TEST(ADisplayOfAnotherUser, IsNotUsable) {
+  if (ranWithItsOwnRoot()) return;
+  const TemporaryFolder folder;
+  const std::string number = std::to_string(20'000 + getpid() % 40'000);
+  const std::string abstract = std::string(1, '\0') + "/tmp/.X11-unix/X" + number;
+  const std::string wayland = folder.path() / "wayland-7";
+  unsetenv("WAYLAND_DISPLAY");
+  setenv("DISPLAY", (":" + number).c_str(), 1);
+  EXPECT_FALSE(hasUsableDisplay());
+  {
+    const Listener own(abstract, root);
+    ASSERT_TRUE(own.listens());
+    EXPECT_TRUE(hasUsableDisplay());
+  }
+  {
+    const Listener foreign(abstract, somebodyElse);
+    ASSERT_TRUE(foreign.listens());
+    EXPECT_FALSE(hasUsableDisplay()) << "a stale DISPLAY, and whoever waits there now";
+    const Listener compositor(wayland, root);
+    setenv("WAYLAND_DISPLAY", wayland.c_str(), 1);
+    EXPECT_FALSE(hasUsableDisplay()) << "a window could still be shown on the other one";
+  }
+  EXPECT_FALSE(hasUsableDisplay()) << "nobody listens any more";
+  std::filesystem::remove(wayland);
+  const Listener compositor(wayland, somebodyElse);
+  ASSERT_TRUE(compositor.listens());
+  EXPECT_FALSE(hasUsableDisplay());
+}
+
+TEST(ADisplayOnTheNetwork, IsUsableIfItIsTheOneThatWasNamed) {
+  unsetenv("WAYLAND_DISPLAY");
+  const int server = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+  sockaddr_in address{};
+  address.sin_family = AF_INET;
+  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+  int number = 4000;
+  do {
+    address.sin_port = htons(static_cast<std::uint16_t>(6000 + ++number));
+  } while (bind(server, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0 && number < 5000);
+  ASSERT_EQ(listen(server, 4), 0);
+  const std::string name = "127.0.0.1:" + std::to_string(number) + ".0";
+  setenv("DISPLAY", name.c_str(), 1);
+  EXPECT_FALSE(hasUsableDisplay());
+  EXPECT_FALSE(hasUsableDisplay("127.0.0.1:1.0"));
+  EXPECT_TRUE(hasUsableDisplay(name));
+  close(server);
+  EXPECT_FALSE(hasUsableDisplay(name)) << "nobody listens any more";
+  for (const char* broken : {"127.0.0.1", "127.0.0.1:", "127.0.0.1:x", "127.0.0.1:99999", ":", ""}) {
+    setenv("DISPLAY", broken, 1);
+    EXPECT_FALSE(hasUsableDisplay(broken)) << broken;
+  }
 }
 
 }  // namespace

@@ -59,6 +59,8 @@ TEST(ASetting, IsTakenFromTheFileAndFromTheCommandLine) {
   for (const auto& made : configurationsWith("plugins", "/opt/plug ins")) EXPECT_EQ(made.plugins, "/opt/plug ins");
   for (const auto& made : configurationsWith("terminal", "/dev/pts/3="))
     EXPECT_THAT(made.terminal, Optional(std::string("/dev/pts/3=")));
+  for (const auto& made : configurationsWith("display", "localhost:10.0"))
+    EXPECT_THAT(made.display, Optional(std::string("localhost:10.0")));
 }
 
 TEST(TheAlert, IsOneOfItsWords) {
@@ -135,7 +137,7 @@ TEST(AWrongSetting, IsNamedWithWhatIsRight) {
 }
 
 TEST(AWord, IsATextInTheFile) {
-  for (const char* name : {"plugins", "alert", "terminal", "keychain", "log"}) {
+  for (const char* name : {"plugins", "alert", "terminal", "display", "keychain", "log"}) {
     for (const Value& value : std::vector<Value>{1, true, Array{"desktop"}, Dictionary()}) {
       DaemonConfiguration configuration;
       EXPECT_THAT(
