@@ -125,6 +125,11 @@ Findings findings() {
     all.push_back({.check = "session bus", .found = "answers"});
     const Dictionary status = client.status();
     all.push_back({.check = "accountd", .found = "answers"});
+    if (status.find("configuration_trouble") != nullptr) {
+      // Then it has looked at nothing else.
+      all.push_back(findingOf(status, {"configuration", "configuration", Level::fail}));
+      return all;
+    }
     for (const Reported& piece : reported) all.push_back(findingOf(status, piece));
     all.push_back(examineSocialDaemon(client));
   } catch (const CallFailed& failure) {

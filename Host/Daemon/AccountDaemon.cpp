@@ -55,7 +55,7 @@ std::optional<std::filesystem::path> credentialsFolder() {
 
 ServerConfiguration serverConfiguration() {
   const auto file = configurationFile("server.toml");
-  const auto table = readTomlFile(file);
+  const auto table = readConfiguration(file);
   if (!table) return {};
   try {
     return ServerConfiguration(*table);

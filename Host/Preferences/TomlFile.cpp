@@ -12,6 +12,8 @@
 #include <sstream>
 #include <string_view>
 
+#include "Host/Files/Exposure.h"
+
 namespace palisade {
 namespace {
 
@@ -183,6 +185,18 @@ void replaceFile(const std::filesystem::path& path, const std::string& content) 
 std::optional<Dictionary> readTomlFile(const std::filesystem::path& path) {
   const auto content = contentOf(path);
   return content ? std::optional(dictionaryFromToml(parse(*content, path))) : std::nullopt;
+}
+
+void requireUnexposed(const std::filesystem::path& path) {
+  const auto exposure = exposureOfFile(path);
+  if (!exposure) return;
+  throw ExposedFile(path.string() + " is not read, because others could have written it: " + exposure->path.string() + " " +
+                    exposure->problem + ". Look at what the file says, then run " + exposure->remedy + ".");
+}
+
+std::optional<Dictionary> readConfiguration(const std::filesystem::path& path) {
+  requireUnexposed(path);
+  return readTomlFile(path);
 }
 
 void setInTomlFile(const std::filesystem::path& path, const std::string& key, const std::optional<Value>& value) {

@@ -71,7 +71,7 @@ void Vantad::run() {
 
 ServerConfiguration Vantad::readConfiguration() {
   try {
-    return ServerConfiguration(readTomlFile(_options.configuration).value_or(Dictionary()));
+    return ServerConfiguration(palisade::readConfiguration(_options.configuration).value_or(Dictionary()));
   } catch (const std::exception& error) {
     _log.record("Vantad::readConfiguration", LogLevel::error, "%@: %@ No server is asked until that is mended.", "path, reason",
                 _options.configuration.string(), std::string_view(error.what()));

@@ -17,7 +17,7 @@ using namespace palisade;
 
 void serve(VantadOptions options) {
   dropDumpable();
-  if (const auto table = readTomlFile(options.accountdConfiguration)) options.takeDefaultsFrom(*table);
+  if (const auto table = readConfiguration(options.accountdConfiguration)) options.takeDefaultsFrom(*table);
   JournalLog log(options.logLevel.value_or(LogLevel::notice), nullptr);
   Vantad(options, log).run();
 }

@@ -50,6 +50,9 @@ BUS_CONFIGURATION = """<!DOCTYPE busconfig PUBLIC "-//freedesktop//DTD D-Bus Bus
 </busconfig>
 """
 
+# The daemons refuse configuration that others may write, whatever this user's files are like otherwise.
+os.umask(0o022)
+
 
 def use_build_of_command_line() -> None:
     """Takes the build folder from the command line, before unittest reads it."""
