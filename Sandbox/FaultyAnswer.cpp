@@ -86,7 +86,7 @@ void answerWithFault(const Fault& fault, const std::string& answer, RawConnectio
   // Escape sequences, a bell, a line of its own, marks that turn the text around, and code points that are no characters.
   static constexpr const char* message =
       "{\"error\":\"fault\",\"error_msg\":\"Red: \\u001b[31m\\u001b]0;title\\u0007\\u009b2J\\r\\nAccess is granted."
-      "\\u202Eturned\\u2066\\u200B \xEF\xB7\x90\xEF\xB7\xAF\xEF\xBF\xBE\xEF\xBF\xBF\xF4\x8F\xBF\xBF end\"}";
+      "\\u202Eturned\\u2066\\u200B\\u0000 \xEF\xB7\x90\xEF\xB7\xAF\xEF\xBF\xBE\xEF\xBF\xBF\xF4\x8F\xBF\xBF end\"}";
   static constexpr const char* page = "<!DOCTYPE html><title>Sign in</title><p>Please sign in to use this network.";
   switch (fault.kind) {
     case FaultKind::silent: connection.waitForClient(); break;

@@ -5,12 +5,12 @@
 #include <systemd/sd-journal.h>
 #include <unistd.h>
 
-#include <cctype>
 #include <cstdio>
 #include <exception>
 #include <string>
 
 #include "Host/Log/Redaction.h"
+#include "Host/Text/PrintableText.h"
 
 namespace palisade {
 namespace {
@@ -25,10 +25,8 @@ std::string_view nameOf(LogLevel level) {
 }
 
 void writeToStderr(LogLevel level, std::string_view message) {
-  std::string line = std::string(nameOf(level)) + ": ";
   // A record is one line, and what it quotes does not steer the terminal that shows it.
-  for (const char character : message) line += std::iscntrl(static_cast<unsigned char>(character)) != 0 ? ' ' : character;
-  line += "\n";
+  const std::string line = std::string(nameOf(level)) + ": " + printableText(message) + "\n";
   std::fwrite(line.data(), 1, line.size(), stderr);
 }
 

@@ -202,18 +202,25 @@ class Connection:
         self._send(SIGNAL, fields, marshalled(signature, values))
 
     def _send(self, kind: int, fields: dict, content: bytes, descriptors=()) -> int:
-        self._serial += 1
         if descriptors:
             fields[DESCRIPTORS] = len(descriptors)
-        header = bytearray(struct.pack("<BBBBII", ord("l"), kind, 0, 1, len(content), self._serial))
-        write(header, "a(yv)", [(code, (FIELD_TYPES[code], value)) for code, value in fields.items() if value])
-        pad(header, 8)
-        message = bytes(header) + content
+        message = self.marshalled_message(kind, fields, content)
         if descriptors:
             rights = [(socket.SOL_SOCKET, socket.SCM_RIGHTS, array.array("i", descriptors))]
             message = message[self._socket.sendmsg([message], rights):]
-        self._socket.sendall(message)
+        self.send_raw(message)
         return self._serial
+
+    def marshalled_message(self, kind: int, fields: dict, content: bytes) -> bytes:
+        """A message of this connection's next serial number. Fields of numbers that nobody knows are texts."""
+        self._serial += 1
+        header = bytearray(struct.pack("<BBBBII", ord("l"), kind, 0, 1, len(content), self._serial))
+        write(header, "a(yv)", [(code, (FIELD_TYPES.get(code, "s"), value)) for code, value in fields.items() if value])
+        pad(header, 8)
+        return bytes(header) + content
+
+    def send_raw(self, message: bytes) -> None:
+        self._socket.sendall(message)
 
     def call(self, destination: str, path: str, interface: str, member: str, signature: str = "", values=(), *,
              timeout: float = PATIENCE, **more) -> list:

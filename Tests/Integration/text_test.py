@@ -8,8 +8,10 @@ does not.
 import contextlib
 import json
 import pathlib
+import random
 import shutil
 import sqlite3
+import struct
 import subprocess
 import sys
 import unittest
@@ -17,7 +19,8 @@ import unittest
 import trial
 from accounts import (FACEBOOK, GRANTED, MANAGER, NAME, OBJECT, PENDING, REFUSED, REQUEST, WITHDRAWN, Caller,
                       facebook_options)
-from bus_wire import BusError
+from bus_wire import (CALL, DESTINATION, ERROR, ERROR_NAME, INTERFACE, MEMBER, PATH, REPLY, REPLY_SERIAL, SIGNAL, SIGNATURE, BusError,
+                      marshalled)
 from hostile_test import methods
 from trial import wait_until
 
@@ -150,6 +153,40 @@ class Signals(Texts):
                         ("/org/freedesktop/DBus", bus, "NameOwnerChanged", "u", [7])):
                     self.caller.emit(NAME if sender else None, path, interface, member, signature, values)
         self.assertEqual(self.caller.start_request().outcome()[0], GRANTED)
+
+
+class Messages(Texts):
+    def test_of_every_shape_cost_their_sender_at_most_the_connection(self):
+        """Calls, replies, errors and signals of no sense, some with bytes changed: whatever of it the bus passes on."""
+        chance = random.Random(5)
+        sender = self.session.caller()
+        for number in range(1_500):
+            try:
+                sender.send_raw(self.nonsense(chance, sender))
+                if number % 10 == 0:
+                    sender.call("org.freedesktop.DBus", "/", "org.freedesktop.DBus.Peer", "Ping")
+            except (OSError, ValueError, LookupError, struct.error):
+                sender.close()
+                sender = self.session.caller()
+        sender.close()
+        self.assertEqual(self.caller.start_request().outcome()[0], GRANTED)
+
+    @staticmethod
+    def nonsense(chance: random.Random, sender: Caller) -> bytes:
+        kind = chance.choice((CALL, CALL, REPLY, ERROR, SIGNAL, SIGNAL, 5))
+        signature, values = chance.choice((("sa{sv}", ["\ufdd0", {}]), ("s", ["\uffff"]), ("sss", ["a", "b", ""]), ("v", [("s", "\ufdd0")]),
+                                           ("a{sv}", [{"\ufdd0": ("s", "a")}]), ("av", [[("s", "\ufdd0"), ("v", ("a{sv}", {}))]])))
+        fields = {PATH: OBJECT, INTERFACE: chance.choice((MANAGER, "com.veltran.Notify1", "org.freedesktop.DBus")),
+                  MEMBER: chance.choice(("ListGrants", "Posted", "NameOwnerChanged", "RequestAccess", "History")), DESTINATION: NAME,
+                  SIGNATURE: signature, 200: "\ufdd0" if chance.random() < 0.3 else None}
+        if kind in (REPLY, ERROR):
+            fields |= {REPLY_SERIAL: chance.randrange(1, 50), ERROR_NAME: "org.example.Error"}
+        message = bytearray(sender.marshalled_message(kind, fields, marshalled(signature, values)))
+        for _ in range(chance.choice((0, 0, 1, 2))):
+            # Not the lengths: the bus would wait for the rest.
+            place = chance.choice((*range(4), *range(8, 12), *range(16, len(message))))
+            message[place] = chance.choice((0, 1, 2, 255, chance.randrange(256)))
+        return bytes(message)
 
 
 class Names(Texts):

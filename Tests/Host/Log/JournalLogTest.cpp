@@ -84,9 +84,9 @@ TEST(ARecord, StaysOneLineAndDoesNotSteerATerminal) {
               JournalLog(LogLevel::notice, nullptr, noJournal)
                   .record("ask", LogLevel::notice, "Asked\nfor %@.", "name",
                           std::string_view("Editor\r\nerror: \x1b[2J\x7f"
-                                           "forged"));
+                                           "forged \u009b[2J \u202Edenied"));
             }),
-            "notice: Asked for Editor  error:  [2J forged.\n");
+            "notice: Asked\uFFFDfor Editor\uFFFD\uFFFDerror: \uFFFD[2J\uFFFDforged \uFFFD[2J \uFFFDdenied.\n");
 }
 
 TEST(ARecord, HoldsNoSecret) {
