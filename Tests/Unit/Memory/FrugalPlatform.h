@@ -6,6 +6,7 @@
 /// called; its handlers run with `CountedAllocations`, and what leaves one is remembered. Threads: used by one thread at a
 /// time. Ownership: lives as long as the process, because the plug-in keeps a queue and a registration.
 
+#include <list>
 #include <memory>
 #include <optional>
 #include <string>
@@ -101,7 +102,10 @@ class FrugalPlatform final : Log,
                              StringTable,
                              SerialQueue {
  public:
-  static FrugalPlatform& create() { return *new FrugalPlatform; }
+  static FrugalPlatform& create() {
+    static auto& platforms = *new std::list<std::unique_ptr<FrugalPlatform>>;
+    return *platforms.emplace_back(new FrugalPlatform);
+  }
 
   AlertResponse userAnswers = AlertResponseDefaultButton;
   std::string authorizationBody = R"({"access_token": "a token of some length", "permissions": ["email", "user_likes"]})";

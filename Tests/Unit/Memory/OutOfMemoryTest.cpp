@@ -4,6 +4,7 @@
 // was not stored.
 
 #include <functional>
+#include <list>
 #include <ostream>
 #include <string>
 #include <vector>
@@ -65,6 +66,12 @@ struct Stage {
     };
   }
 };
+
+// Stages stay as long as the process, because their platforms do.
+Stage& newStage() {
+  static auto& stages = *new std::list<Stage>;
+  return stages.emplace_back();
+}
 
 void request(Stage& stage, AccessCompletion completion) {
   stage.plugin->handleAccessRequestToAccountsOfType(stage.accountType, stage.client, stage.options, stage.store, true,
@@ -144,7 +151,7 @@ class WhenMemoryRunsOut : public ::testing::TestWithParam<Operation> {
   // Runs the operation under the plan. Answers whether an allocation failed.
   static bool run(const AllocationPlan& plan, const std::function<void(FrugalPlatform&)>& end) {
     const Operation& operation = GetParam();
-    Stage& stage = *new Stage;  // Its platform stays as long as the process.
+    Stage& stage = newStage();
     operation.prepare(stage);
     const bool heldAGrant = holdsAGrant(stage);
     bool threw = false;
@@ -200,7 +207,7 @@ INSTANTIATE_TEST_SUITE_P(, WhenMemoryRunsOut, ::testing::ValuesIn(operations), n
 TEST(AHandlerThatIsDroppedWhenMemoryHasRunOut, IsARefusalAllTheSame) {
   for (const bool andAllLater : {false, true}) {
     for (std::size_t n = 1; n <= 5; ++n) {
-      Stage& stage = *new Stage;
+      Stage& stage = newStage();
       anAccount(stage);
       stage.platform.holdsAnswers = true;
       request(stage, stage.completion());
