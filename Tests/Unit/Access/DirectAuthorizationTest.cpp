@@ -176,7 +176,7 @@ TEST(ADirectAuthorization, ReportsTheStoresErrorAfterTheAccessRequestRecord) {
   Scene scene;
   scene.addAccount();
   scene.addRecord({.granted = false, .options = Dictionary()});
-  const Error full{.domain = "store", .code = 28, .description = "The disk is full."};
+  const Error full{.domain = "store", .code = 28, .description = "The disk is full.", .furtherInfo = {{"device", "/dev/sda1"}}};
   scene.authorizations.answerWrites({full});
 
   EXPECT_THAT(scene.authorize(), isRefusalWith(full));

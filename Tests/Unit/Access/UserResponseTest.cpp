@@ -24,7 +24,7 @@ struct UserAnswer {
   bool approves = true;
   PermissionSet existing = {};
   PermissionSetRef asked = permissionSet({"email"});
-  std::optional<std::string> audience = std::nullopt;
+  std::string audience = std::string(FacebookAudienceOnlyMe);
   bool isFirstTimeRequest = false;
   bool skipsServer = false;
 };
@@ -32,18 +32,18 @@ struct UserAnswer {
 CompletionCall handle(Scene& scene, const UserAnswer& answer, const std::shared_ptr<Account>& account) {
   return scene.perform([&](const AccessCompletion& completion) {
     scene.plugin->_handleUserResponse(answer.approves, scene.client, photosAppID,
-                                      std::make_shared<const Dictionary>(persistentOptions()), account, scene.facebook,
-                                      answer.existing, answer.asked, answer.audience, answer.isFirstTimeRequest,
+                                      std::make_shared<const Dictionary>(persistentOptions(answer.audience)), account,
+                                      scene.facebook, answer.existing, answer.asked, answer.audience, answer.isFirstTimeRequest,
                                       answer.skipsServer, scene.store, completion);
   });
 }
 
 CompletionCall handle(Scene& scene, const UserAnswer& answer) { return handle(scene, answer, scene.makeAccount()); }
 
-Value tracedRecord(bool granted, Value permissions) {
+Value tracedRecord(bool granted, Value permissions, std::string_view audience = FacebookAudienceOnlyMe) {
   return Dictionary{{"client", Dictionary{{"$client", "photos"}}},
                     {"granted", granted},
-                    {"options", persistentOptions()},
+                    {"options", persistentOptions(audience)},
                     {"permissions", std::move(permissions)}};
 }
 
@@ -79,7 +79,7 @@ TEST(ARefusal, IsStoredWithoutPermissionsForAClientThatHeldNoGrant) {
   Scene scene;
   EXPECT_THAT(handle(scene, {.approves = false, .existing = {"user_likes"}}), isRefusalWith(accountsError(7)));
   EXPECT_THAT(writes(scene), stored(tracedRecord(false, Value())));
-  EXPECT_EQ(scene.record(), (RecordData{.granted = false, .options = persistentOptions()}));
+  EXPECT_EQ(scene.record(), (RecordData{.granted = false, .options = persistentOptions(FacebookAudienceOnlyMe)}));
   EXPECT_THAT(stepsOf(scene.platform.trace),
               ElementsAre("Preferences.copyValue", "AuthorizationManager.setAuthorization", "completion"));
 }
@@ -139,7 +139,7 @@ TEST(AnApproval, RecordsWhatTheServerGrantedAndNothingElse) {
              {.existing = {"email"}, .asked = permissionSet({"user_likes"}), .audience = std::string(FacebookAudienceFriends)}),
       isGrant());
 
-  EXPECT_THAT(writes(scene), stored(tracedRecord(true, tracedSet({"user_likes", "user_photos"}))));
+  EXPECT_THAT(writes(scene), stored(tracedRecord(true, tracedSet({"user_likes", "user_photos"}), FacebookAudienceFriends)));
   EXPECT_THAT(scene.platform.trace.named("FacebookAuthorizationRequest.init"),
               ElementsAre(Field(&Event::members, Dictionary{{"appID", photosAppID},
                                                             {"bundleID", "org.example.photos"},

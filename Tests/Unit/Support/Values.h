@@ -109,7 +109,8 @@ inline ServerAnswer serverGrants(Array permissions, Delivery delivery = Delivery
           .delivery = delivery};
 }
 
-inline const Error networkDown{.domain = "org.example.network", .code = 7, .description = "No route to host"};
+inline const Error networkDown{
+    .domain = "org.example.network", .code = 7, .description = "No route to host", .furtherInfo = {{"attempts", 3}}};
 inline ServerAnswer serverCannotBeReached() { return {.error = networkDown}; }
 
 /// The name of a row of a table test.
