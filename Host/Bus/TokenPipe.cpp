@@ -4,8 +4,10 @@
 #include <poll.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstddef>
+#include <mutex>
 #include <optional>
 #include <utility>
 
@@ -35,18 +37,27 @@ struct Pipe {
   sdbus::UnixFd writer;
 };
 
-// Moves what there is to the end of `content`; none when there is nothing now, false at the end of the pipe.
-std::optional<bool> takeMore(const sdbus::UnixFd& source, const Pipe& ours, std::string& content) {
+// Moves what there is to the end of `content`; none when there is nothing now, false at the end of the pipe. One pipe of ours
+// is enough for all: it is empty before and after, and descriptors are what a crowd of senders makes scarce.
+std::optional<bool> takeMore(const sdbus::UnixFd& source, std::string& content) {
   constexpr std::size_t portion = 4096;
-  const ssize_t moved = splice(source.get(), nullptr, ours.writer.get(), nullptr, portion, SPLICE_F_NONBLOCK);
-  if (moved == 0) return false;
-  if (moved < 0 && (errno == EAGAIN || errno == EINTR)) return std::nullopt;
+  static const Pipe ours;
+  static std::mutex mutex;
+  const std::lock_guard lock(mutex);
   const std::size_t before = content.size();
-  if (moved > 0) content.resize(before + static_cast<std::size_t>(moved));
-  if (moved < 0 || read(ours.reader.get(), content.data() + before, content.size() - before) != moved) {
-    throw BusFailure(BusFailureKind::invalidArguments, "The token could not be read from its pipe.");
+  // First, for it may fail: what has been moved has to be taken out again.
+  content.resize(before + portion);
+  const ssize_t moved = splice(source.get(), nullptr, ours.writer.get(), nullptr, portion, SPLICE_F_NONBLOCK);
+  const int reason = errno;
+  content.resize(before + static_cast<std::size_t>(std::max<ssize_t>(moved, 0)));
+  for (std::size_t place = before; place < content.size();) {
+    const ssize_t taken = read(ours.reader.get(), content.data() + place, content.size() - place);
+    if (taken > 0) place += static_cast<std::size_t>(taken);
   }
-  return true;
+  if (moved > 0) return true;
+  if (moved == 0) return false;
+  if (reason == EAGAIN || reason == EINTR) return std::nullopt;
+  throw BusFailure(BusFailureKind::invalidArguments, "The token could not be read from its pipe.");
 }
 
 }  // namespace
@@ -56,7 +67,6 @@ std::string readToEnd(const sdbus::UnixFd& descriptor, std::chrono::milliseconds
     throw BusFailure(BusFailureKind::invalidArguments, "A token has to come in a pipe.");
   }
   const auto deadline = std::chrono::steady_clock::now() + limit;
-  const Pipe ours;
   std::string content;
   while (true) {
     const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now());
@@ -66,7 +76,7 @@ std::string readToEnd(const sdbus::UnixFd& descriptor, std::chrono::milliseconds
       throw BusFailure(BusFailureKind::invalidArguments,
                        "The token did not come to its end in time. Write it, and close the pipe.");
     }
-    const auto isMore = ready > 0 ? takeMore(descriptor, ours, content) : std::nullopt;
+    const auto isMore = ready > 0 ? takeMore(descriptor, content) : std::nullopt;
     if (isMore == false) return content;
     if (content.size() > longestAccountToken)
       throw BusFailure(BusFailureKind::invalidArguments, "The token is longer than 64 KiB.");
