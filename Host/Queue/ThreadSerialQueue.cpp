@@ -34,6 +34,7 @@ void ThreadSerialQueue::async(std::function<void()> work) {
 }
 
 void ThreadSerialQueue::sync(const std::function<void()>& work) {
+  _beforeWaiting();
   if (runAtOnce(work)) return;
   std::packaged_task<void()> task([&] { work(); });
   auto done = task.get_future();

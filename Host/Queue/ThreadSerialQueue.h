@@ -8,8 +8,10 @@
 
 #include <condition_variable>
 #include <deque>
+#include <functional>
 #include <mutex>
 #include <thread>
+#include <utility>
 
 #include "Platform/SerialQueue.h"
 
@@ -17,7 +19,10 @@ namespace palisade {
 
 class ThreadSerialQueue final : public SerialQueue {
  public:
-  explicit ThreadSerialQueue(std::string_view label) : _label(label) {}
+  explicit ThreadSerialQueue(
+      std::string_view label, std::function<void()> beforeWaiting = [] {})
+      : _label(label),
+        _beforeWaiting(std::move(beforeWaiting)) {}
   ~ThreadSerialQueue() override;
 
   ThreadSerialQueue(const ThreadSerialQueue&) = delete;
@@ -32,6 +37,7 @@ class ThreadSerialQueue final : public SerialQueue {
   bool runAtOnce(const std::function<void()>& work);
 
   const std::string _label;
+  const std::function<void()> _beforeWaiting;
   std::mutex _mutex;
   std::condition_variable _changed;
   std::deque<std::function<void()>> _work;
@@ -42,9 +48,16 @@ class ThreadSerialQueue final : public SerialQueue {
 
 class ThreadSerialQueueFactory final : public SerialQueueFactory {
  public:
+  /// `beforeWaiting` is called on a thread that is about to have synchronous work done: it waits for what stands before it, and
+  /// the work takes its time.
+  explicit ThreadSerialQueueFactory(std::function<void()> beforeWaiting = [] {}) : _beforeWaiting(std::move(beforeWaiting)) {}
+
   std::shared_ptr<SerialQueue> makeSerialQueue(std::string_view label) override {
-    return std::make_shared<ThreadSerialQueue>(label);
+    return std::make_shared<ThreadSerialQueue>(label, _beforeWaiting);
   }
+
+ private:
+  const std::function<void()> _beforeWaiting;
 };
 
 }  // namespace palisade

@@ -37,6 +37,16 @@ TEST(ASerialQueue, RunsItsWorkInTheOrderOfArrival) {
   EXPECT_EQ(seen, expected);
 }
 
+TEST(ASerialQueue, SaysWhenSomebodyIsAboutToWaitForIt) {
+  int announced = 0;
+  ThreadSerialQueueFactory queues([&] { ++announced; });
+  const auto queue = queues.makeSerialQueue(label);
+  queue->async([] {});
+  EXPECT_EQ(announced, 0);
+  queue->sync([&] { EXPECT_EQ(announced, 1); });
+  EXPECT_EQ(announced, 1);
+}
+
 TEST(ASerialQueue, RunsOnePieceAtATimeWhoeverHandsItIn) {
   constexpr int callers = 4;
   constexpr int pieces = 200;
