@@ -12,7 +12,8 @@ SqliteAccountStore::SqliteAccountStore(AccountStoreOptions options, const Client
       _connections(std::make_unique<Store>(Database::open({.path = std::move(options.path),
                                                            .applicationID = accountStoreApplicationID,
                                                            .migrations = accountStoreMigrations,
-                                                           .onDamage = options.onDamage}))) {}
+                                                           .onDamage = options.onDamage}),
+                                           std::move(options.beforeDisk))) {}
 
 SqliteAccountStore::~SqliteAccountStore() = default;
 

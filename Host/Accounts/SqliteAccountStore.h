@@ -47,6 +47,9 @@ struct AccountStoreOptions {
   std::filesystem::path path;
   DamagedStore onDamage = DamagedStore::refuse;
   std::function<void(const StoreChange&)> onChange = nullptr;
+  /// Called on the thread that is about to read the store's file or to write it, which may take as long as a disk does. What is
+  /// kept in memory is read without it.
+  std::function<void()> beforeDisk = [] {};
 };
 
 struct AccountRecord {

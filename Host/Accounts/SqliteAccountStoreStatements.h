@@ -2,6 +2,10 @@
 
 /// The account store's queries, each prepared once for its connection. Only the files of `SqliteAccountStore` include this.
 
+#include <functional>
+#include <memory>
+#include <utility>
+
 #include "Host/Accounts/ReadCache.h"
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Sqlite/Connections.h"
@@ -108,8 +112,24 @@ struct AccountStoreReader {
   Statement historyOfClient;
 };
 
-struct SqliteAccountStore::Store : Connections<AccountStoreWriter, AccountStoreReader> {
-  using Connections::Connections;
+struct SqliteAccountStore::Store : private Connections<AccountStoreWriter, AccountStoreReader> {
+  Store(std::unique_ptr<Database> database, std::function<void()> announceDisk)
+      : Connections(std::move(database)),
+        beforeDisk(std::move(announceDisk)) {}
+
+  using Connections::database;
+
+  template <typename Work>
+  auto write(Work work) {
+    beforeDisk();
+    return Connections::write(std::move(work));
+  }
+
+  template <typename Work>
+  auto read(Work work) {
+    beforeDisk();
+    return Connections::read(std::move(work));
+  }
 
   // A write that fails may have been stored all the same.
   template <typename Cache, typename Work>
@@ -121,6 +141,7 @@ struct SqliteAccountStore::Store : Connections<AccountStoreWriter, AccountStoreR
     return write(work);
   }
 
+  const std::function<void()> beforeDisk;
   ReadCache<std::vector<AccountRecord>> accountsOfType;
   ReadCache<std::shared_ptr<const ClientAuthorization>> authorizations;  // by keyOf(type, client); their clients do not count
 };

@@ -127,6 +127,21 @@ TEST_F(Authorizations, TellTheListenerWhoseHaveChanged) {
                                    isChange(StoreChange::Kind::authorizations, type, std::nullopt)));
 }
 
+TEST_F(Authorizations, AreReadFromTheDiskOnceAndSayWhenTheyAre) {
+  int announced = 0;
+  store = nullptr;
+  store =
+      std::make_unique<SqliteAccountStore>(AccountStoreOptions{.path = path, .beforeDisk = [&] { ++announced; }}, directory);
+  set("one", grantNumber(1));
+  EXPECT_EQ(announced, 1);
+  for (int read = 0; read < 3; ++read) EXPECT_THAT(get("one"), Optional(grantNumber(1)));
+  EXPECT_EQ(announced, 2);
+  for (int read = 0; read < 3; ++read) store->accountsWithAccountTypeIdentifier(facebookType.identifier());
+  EXPECT_EQ(announced, 3);
+  get("nobody");
+  EXPECT_EQ(announced, 4);
+}
+
 TEST_F(Authorizations, MayBeReadByTheListener) {
   std::optional<RecordContent> seen;
   store.reset();
