@@ -77,6 +77,33 @@ void callEcho(sd_bus& bus) {
 
 void requestGrantedAccess(sd_bus& bus) { requireGrant(requestAccess(bus).response); }
 
+int requestWithoutWaiting(sd_bus& bus, int count) {
+  struct Replies {
+    int all = 0;
+    int pending = 0;
+  } replies;
+  const auto countReply = [](sd_bus_message* message, void* place, sd_bus_error*) {
+    auto& counted = *static_cast<Replies*>(place);
+    ++counted.all;
+    const char* path = nullptr;
+    std::uint32_t response = 0;
+    if (sd_bus_message_read(message, "ou", &path, &response) >= 0 && response == pending) ++counted.pending;
+    return 0;
+  };
+  for (int request = 0; request < count; ++request) {
+    const Message call = newCall(bus, accounts, accountsPath, manager, "RequestAccess");
+    requireSuccess(sd_bus_message_append(call.get(), "sa{sv}a{sv}", facebook, 2, "FacebookAppIdKey", "s", "1234567890",
+                                         "FacebookPermissionsKey", "as", 1, "user_playlists", 0),
+                   "The request cannot be written");
+    requireSuccess(sd_bus_call_async(&bus, nullptr, call.get(), countReply, &replies, UINT64_MAX),
+                   "The request cannot be sent");
+  }
+  while (replies.all < count) {
+    if (requireSuccess(sd_bus_process(&bus, nullptr), "The bus went away") == 0) sd_bus_wait(&bus, UINT64_MAX);
+  }
+  return replies.pending;
+}
+
 WaitingApplication::WaitingApplication(sd_bus& bus) : _bus(bus) {
   sd_bus_slot* slot = nullptr;
   requireSuccess(sd_bus_match_signal(&bus, &slot, accounts, nullptr, request, "Response", rememberOutcome, &_outcome),

@@ -21,6 +21,10 @@ void callEcho(sd_bus& bus);
 /// A request that an earlier grant answers.
 void requestGrantedAccess(sd_bus& bus);
 
+/// So many requests that the server has to be asked about, whose outcomes nobody waits for. Returns when each has been replied
+/// to: how many of them the daemon carries.
+int requestWithoutWaiting(sd_bus& bus, int count);
+
 /// An application that listens for the outcomes of its requests.
 class WaitingApplication {
  public:

@@ -18,6 +18,7 @@
 #include "Benchmarks/Daemon/BusLoad.h"
 #include "Benchmarks/Daemon/MeasuredDaemon.h"
 #include "Benchmarks/Daemon/ServerExchange.h"
+#include "Benchmarks/Daemon/StandingRequests.h"
 #include "Host/Accounts/AccountStoreSchema.h"
 #include "Host/Sqlite/Database.h"
 #include "Host/Sqlite/Transaction.h"
@@ -119,6 +120,32 @@ void measureCalls() {
           preparePermissionStore, lookUpPermission);
   addPeer(all, *bus, "peer: polkit, CheckAuthorization", "org.freedesktop.PolicyKit1", checkAuthorization, checkAuthorization);
   for (const int clients : {1, 4, 16}) measureSideBySide(all, clients);
+}
+
+// Quiet and beside the other application in turn, so that whatever else the machine does meets both.
+void measureBesideStandingRequests() {
+  constexpr int others = 300;
+  const MeasuredDaemon daemon(daemonProgram);
+  Measurement quiet;
+  Measurement beside;
+  int standing = 0;
+  for (int round = 0; round < rounds; ++round) {
+    quiet.loads.push_back(measureLoad(requestGrantedAccess, 1, roundLength, daemon.process()));
+    const StandingRequests requests(others);
+    standing = requests.standing();
+    beside.loads.push_back(measureLoad(requestGrantedAccess, 1, roundLength, daemon.process()));
+  }
+  std::printf("\n%-58s %8s %8s\n", "request, from an earlier grant", "median", "p99");
+  const auto print = [](const std::string& name, const Measurement& measurement) {
+    std::printf("%-58s %5.0f us %5.0f us\n", name.c_str(), measurement.of(&Load::medianMicroseconds),
+                measurement.of(&Load::slowestHundredthMicroseconds));
+  };
+  print("quiet", quiet);
+  print("beside " + std::to_string(others) + " of another at a stopped server (" + std::to_string(standing) + " stand)",
+        beside);
+  const double times = beside.of(&Load::slowestHundredthMicroseconds) / quiet.of(&Load::slowestHundredthMicroseconds);
+  std::printf("p99 beside them %.2f times the quiet one: %s\n", times, verdict(times, 2).c_str());
+  std::fflush(stdout);
 }
 
 void measureMemory() {
@@ -233,8 +260,8 @@ struct Part {
 };
 
 constexpr Part parts[] = {
-    {"start", measureStart},       {"calls", measureCalls},       {"memory", measureMemory},
-    {"approval", measureApproval}, {"grants", measureManyGrants},
+    {"start", measureStart},   {"calls", measureCalls},       {"standing", measureBesideStandingRequests},
+    {"memory", measureMemory}, {"approval", measureApproval}, {"grants", measureManyGrants},
 };
 
 void obtainGrant() {
@@ -263,6 +290,7 @@ bool measure(const std::vector<std::string_view>& names) {
 
 int main(int argumentCount, char** arguments) {
   try {
+    if (argumentCount == 3 && std::string_view(arguments[1]) == "stand") palisade::standAtServer(std::atoi(arguments[2]));
     palisade::obtainGrant();
     return palisade::measure({arguments + 1, arguments + argumentCount}) ? 0 : 1;
   } catch (const std::exception& error) {
