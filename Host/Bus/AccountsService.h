@@ -3,10 +3,11 @@
 /// What stands behind the daemon's D-Bus interface, in the daemon's own terms. The interface itself is described in
 /// DBus/com.veltran.Accounts1.xml.
 ///
-/// Threads: each operation runs on a thread of the bus loop and may take as long as a user does; several run at once. Whoever
-/// is about to wait calls `BusLoop::handOver` first. `close` and `callerLeft` come from the thread that reads the bus and never
-/// wait. Ownership: arguments are values. Errors: a `BusFailure` is thrown and becomes the call's error reply; any other
-/// exception becomes the error "Failed".
+/// Threads: each operation runs on a thread of the bus loop and may take as long as a user does; several run at once.
+/// `requestAccess`, `authorize` and `addAccount` begin on the thread that reads the bus, as long as their caller's application
+/// is known, and call `BusLoop::handOver` before they wait for anything. `knownApplication`, `close` and `callerLeft` come from
+/// that thread too and never wait. Ownership: arguments are values. Errors: a `BusFailure` is thrown and becomes the call's
+/// error reply; any other exception becomes the error "Failed".
 
 #include <cstdint>
 #include <functional>
@@ -83,6 +84,10 @@ class AccountsService {
  public:
   virtual ~AccountsService() = default;
 
+  /// The application behind a connection, once it has been identified.
+  virtual std::optional<std::string> knownApplication(const BusCaller& caller) = 0;
+  virtual std::string identify(const BusCaller& caller) = 0;
+
   virtual AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType,
                                       const std::shared_ptr<const Dictionary>& accessOptions, PendingRequest& request) = 0;
   virtual AccessOutcome authorize(const BusCaller& caller, const std::string& accountType, const std::string& client,
@@ -90,6 +95,8 @@ class AccountsService {
   virtual std::string credential(const BusCaller& caller, const std::string& accountType) = 0;
 
   virtual Rows listAccounts(const BusCaller& caller, const std::string& accountType) = 0;
+  /// Takes one more token that a caller is about to send, as long as the result lives. Does not wait; too many are a failure.
+  virtual std::shared_ptr<const void> admitToken(const BusCaller& caller) = 0;
   /// `readToken` waits for whoever sends the token, for seconds at most.
   virtual std::string addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
                                  const std::function<std::string()>& readToken) = 0;

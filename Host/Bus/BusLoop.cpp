@@ -41,7 +41,7 @@ void BusLoop::run() {
   {
     const std::lock_guard lock(_mutex);
     followers.swap(_followers);
-    _firstOfNextLeader.clear();
+    _posted.clear();
   }
   for (std::thread& follower : followers) follower.join();
   if (_failure != nullptr) std::rethrow_exception(_failure);
@@ -59,6 +59,14 @@ void BusLoop::wake() { eventfd_write(_wakeUp, 1); }
 
 void BusLoop::defer(std::function<void()> work) { deferredWork.push_back(std::move(work)); }
 
+void BusLoop::post(std::function<void()> work) {
+  {
+    const std::lock_guard lock(_mutex);
+    _posted.push_back(std::move(work));
+  }
+  wake();
+}
+
 void BusLoop::handOver(std::function<void()> first) {
   if (ledLoop == nullptr) return first();
   ledLoop->giveUpLead(std::move(first));
@@ -70,7 +78,7 @@ void BusLoop::giveUpLead(std::function<void()> first) {
     const std::lock_guard lock(_mutex);
     _hasLeader = false;
     if (_isStopping) return;
-    _firstOfNextLeader.push_back(std::move(first));
+    _posted.push_front(std::move(first));
     if (_parked == 0) {
       _followers.emplace_back([this] { serve(); });
       return;
@@ -99,13 +107,6 @@ void BusLoop::serve() {
 void BusLoop::lead() {
   ledLoop = this;
   try {
-    std::vector<std::function<void()>> first;
-    {
-      const std::lock_guard lock(_mutex);
-      first.swap(_firstOfNextLeader);
-    }
-    for (const auto& work : first) carryOut(work);
-    first.clear();
     while (ledLoop == this) readOnce();
   } catch (...) {
     {
@@ -118,6 +119,8 @@ void BusLoop::lead() {
 }
 
 void BusLoop::readOnce() {
+  carryOutPosted();
+  if (ledLoop != this) return wake();
   const bool mayHoldMore = processNext();
   const bool hadWork = !deferredWork.empty();
   for (const auto& work : std::exchange(deferredWork, {})) carryOut(work);
@@ -127,6 +130,20 @@ void BusLoop::readOnce() {
     return;
   }
   if (!mayHoldMore && !hadWork) waitForMessages();
+}
+
+// What is left when one of them hands the lead over is the next leader's.
+void BusLoop::carryOutPosted() {
+  while (ledLoop == this) {
+    std::function<void()> work;
+    {
+      const std::lock_guard lock(_mutex);
+      if (_posted.empty()) return;
+      work = std::move(_posted.front());
+      _posted.pop_front();
+    }
+    carryOut(work);
+  }
 }
 
 bool BusLoop::processNext() {

@@ -2,9 +2,10 @@
 
 /// Reads the bus, and carries out on the same thread what a message asks for: leader and followers.
 ///
-/// One thread, the leader, waits for messages. A message's work runs on the leader itself, so an answer that needs nobody
-/// changes no thread. Work that is about to wait (for a user, a server, a disk) calls `handOver`: another thread becomes the
-/// leader and goes on reading, and the first one comes back as a follower when its work is done. A work that waits for a day
+/// One thread, the leader, waits for messages. Work that finds everything it needs in memory runs on the leader itself, so an
+/// answer that needs nobody changes no thread. Work that may wait (for a user, a server, a keychain, a disk) calls `handOver`
+/// before it does: another thread becomes the leader and goes on reading, and the first one comes back as a follower when its
+/// work is done. How many threads wait is the callers' care: see `WaitingCalls` and `ClientLanes`. A work that waits for a day
 /// delays nobody. Work that throws has failed alone, and so has a message that cannot be read: the loop goes on. Threads: `run`
 /// is called once and returns after `stop`; `defer` is called from message handlers; `handOver`, `wake` and `stop` from
 /// anywhere. Ownership: borrows the connection. Errors: a lost connection ends `run` with an exception; `onTrouble` is told
@@ -12,6 +13,7 @@
 
 #include <condition_variable>
 #include <cstddef>
+#include <deque>
 #include <functional>
 #include <mutex>
 #include <string>
@@ -40,6 +42,9 @@ class BusLoop {
   /// Has `work` run by this thread when the message handler has returned.
   static void defer(std::function<void()> work);
 
+  /// Has `work` run by the leader as soon as it has done what it does now.
+  void post(std::function<void()> work);
+
   /// Lets another thread read the bus, after it has run `first`. Any thread but the leader runs `first` itself, and that is
   /// all.
   static void handOver(std::function<void()> first = [] {});
@@ -51,6 +56,7 @@ class BusLoop {
   void serve();
   void lead();
   void readOnce();
+  void carryOutPosted();
   bool processNext();
   void carryOut(const std::function<void()>& work);
   void waitForMessages();
@@ -63,7 +69,7 @@ class BusLoop {
   std::mutex _mutex;
   std::condition_variable _leadIsFree;
   std::vector<std::thread> _followers;
-  std::vector<std::function<void()>> _firstOfNextLeader;
+  std::deque<std::function<void()>> _posted;
   std::size_t _parked = 0;
   bool _hasLeader = false;
   bool _isStopping = false;

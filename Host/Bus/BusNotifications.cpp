@@ -40,7 +40,7 @@ std::shared_ptr<NotificationRegistration> BusNotifications::registerHandler(std:
   return std::make_shared<Registration>(
       _connection.addMatch(rule, [this, queue = std::move(queue), handler = std::move(handler)](sdbus::Message& message) {
         BusLoop::defer([this, queue, handler, poster = message.getSender()] {
-          if (_mayPost(poster)) queue->async(handler);
+          _judge(poster, [queue, handler] { queue->async(handler); });
         });
       }));
 }

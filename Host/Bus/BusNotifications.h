@@ -19,17 +19,18 @@ namespace palisade {
 
 class BusNotifications final : public NotificationBus {
  public:
-  /// `mayPost` judges the connection of that unique name, on the thread that reads the bus, when the message has been read.
-  BusNotifications(sdbus::IConnection& connection, std::function<bool(const std::string& uniqueName)> mayPost)
-      : _connection(connection),
-        _mayPost(std::move(mayPost)) {}
+  /// Calls `post` if the connection of that unique name may post, as soon as that is known. It is called on the thread that
+  /// reads the bus, when the message has been read.
+  using Judge = std::function<void(const std::string& uniqueName, std::function<void()> post)>;
+
+  BusNotifications(sdbus::IConnection& connection, Judge judge) : _connection(connection), _judge(std::move(judge)) {}
 
   std::shared_ptr<NotificationRegistration> registerHandler(std::string_view name, std::shared_ptr<SerialQueue> queue,
                                                             std::function<void()> handler) override;
 
  private:
   sdbus::IConnection& _connection;
-  const std::function<bool(const std::string&)> _mayPost;
+  const Judge _judge;
 };
 
 }  // namespace palisade

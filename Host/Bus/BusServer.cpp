@@ -12,11 +12,13 @@
 #include "DBus/Accounts1Adaptor.h"
 #include "Host/Bus/BusLoop.h"
 #include "Host/Bus/BusNotifications.h"
+#include "Host/Bus/CallerApplications.h"
 #include "Host/Bus/CallerDescriptions.h"
 #include "Host/Bus/RequestBounds.h"
 #include "Host/Bus/RequestObjects.h"
 #include "Host/Bus/SignalSender.h"
 #include "Host/Bus/TokenPipe.h"
+#include "Host/Bus/WaitingCalls.h"
 #include "Host/Text/ValidText.h"
 
 namespace palisade {
@@ -104,7 +106,7 @@ class BusServer::Implementation final : private OwnedConnection,
         _service(service),
         _onTrouble(std::move(onTrouble)),
         _loop(*_connection, _onTrouble),
-        _notifications(*_connection, [this](const std::string& poster) { return mayPost(poster); }),
+        _notifications(*_connection, [this](const std::string& poster, auto post) { ifMayPost(poster, std::move(post)); }),
         _requests(*_connection, [this](std::uint64_t identifier) { _service.close(identifier); }),
         _described(addressOfBus(*_connection)) {
     _connection->addMatch(
@@ -145,6 +147,8 @@ class BusServer::Implementation final : private OwnedConnection,
   }
 
  private:
+  using Refuse = CallerApplications::Refuse;
+
   void RequestAccess(AccessResult&& result, std::string accountType, Dictionary accessOptions, Dictionary options) override {
     checked([&] {
       requireName("account_type", accountType);
@@ -181,8 +185,13 @@ class BusServer::Implementation final : private OwnedConnection,
                   Dictionary options) override {
     requireArgument("account_type", accountType);
     requireArgument("username", username);
-    start(std::move(result), options, {}, [this, accountType, username, token](const BusCaller& caller) {
-      return _service.addAccount(caller, accountType, username, [&token] { return readToEnd(token); });
+    // A call that waits keeps its descriptor, so those that are too many are refused before any of them waits.
+    std::shared_ptr<const void> admission;
+    checked([&] { admission = _service.admitToken(*callerOfThisMessage()); });
+    // A copy of the descriptor would be another one.
+    const auto pipe = std::make_shared<const sdbus::UnixFd>(std::move(token));
+    startOnReader(std::move(result), options, [this, accountType, username, pipe, admission](const BusCaller& caller) {
+      return _service.addAccount(caller, accountType, username, [&pipe] { return readToEnd(*pipe); });
     });
   }
 
@@ -260,14 +269,39 @@ class BusServer::Implementation final : private OwnedConnection,
 
   // Calls are carried out when their message handler has returned: the library holds its lock while one runs. A handler answers
   // only what is wrong with the message itself.
+  //
+  // What this begins may wait, so it stands in the line that its application has for this method.
   template <typename Result, typename Work>
   void start(Result&& result, const Dictionary& options, std::initializer_list<std::string_view> known, Work work) {
+    const std::string method = getObject().getCurrentlyProcessedMessage()->getMemberName();
+    startWhenKnown(std::forward<Result>(result), options, known, std::move(work),
+                   [this, method](const std::string& application, const Refuse& refuse, const std::function<void()>& call) {
+                     inLine(application + " " + method, refuse, call);
+                   });
+  }
+
+  // What this begins does not wait, or hands the lead over first.
+  template <typename Result, typename Work>
+  void startOnReader(Result&& result, const Dictionary& options, Work work) {
+    startWhenKnown(std::forward<Result>(result), options, {}, std::move(work),
+                   [](const std::string&, const Refuse&, const std::function<void()>& call) { call(); });
+  }
+
+  template <typename Result, typename Work, typename Begin>
+  void startWhenKnown(Result&& result, const Dictionary& options, std::initializer_list<std::string_view> known, Work work,
+                      Begin begin) {
     checked([&] {
       refuseUnknownOptions(options, known);
       const auto reply = std::make_shared<Result>(std::forward<Result>(result));
-      BusLoop::defer([this, reply, caller = callerOfThisMessage(), work = std::move(work)] {
+      const auto caller = callerOfThisMessage();
+      const Refuse refuse = [reply](const BusFailure& failure) { reply->returnError(busError(failure)); };
+      const auto call = [this, reply, caller, work = std::move(work)] {
         if (const auto refusal = answer(*reply, [&] { return work(*caller); })) _onTrouble(refusal->what());
         sendSignals();
+      };
+      BusLoop::defer([this, caller, refuse, begin = std::move(begin), call] {
+        _applications.whenKnown(
+            caller, [refuse, begin, call](const std::string& application) { begin(application, refuse, call); }, refuse);
       });
     });
   }
@@ -280,10 +314,35 @@ class BusServer::Implementation final : private OwnedConnection,
       const auto request =
           std::make_shared<BusRequest>(_requests, caller->uniqueName, textOption(options, "handle_token"), std::move(result));
       BusLoop::defer([this, request, caller, work = std::move(work)] {
-        carryOut(*request, [&] { return work(*caller, *request); });
-        sendSignals();
+        _applications.whenKnown(
+            caller,
+            [this, request, caller, work](const std::string&) {
+              carryOut(*request, [&] { return work(*caller, *request); });
+              sendSignals();
+            },
+            [request](const BusFailure& failure) { request->fail(failure); });
       });
     });
+  }
+
+  // Has `call` run in the line, or refused.
+  void inLine(const std::string& line, const Refuse& refuse, const std::function<void()>& call) {
+    try {
+      _calls.run(line, [this, call] {
+        try {
+          call();
+        } catch (const std::exception& failure) {
+          _onTrouble(std::string("What a call asked for was cut short: ") + failure.what());
+        }
+      });
+    } catch (const BusFailure& failure) {
+      refuse(failure);
+    }
+  }
+
+  bool isHere(const std::string& uniqueName) {
+    const std::lock_guard lock(_mutex);
+    return _callers.contains(uniqueName);
   }
 
   void sendSignals() {
@@ -356,12 +415,14 @@ class BusServer::Implementation final : private OwnedConnection,
     return caller;
   }
 
-  bool mayPost(const std::string& uniqueName) {
-    try {
-      return _service.mayPost(*callerNamed(uniqueName));
-    } catch (const BusFailure&) {
-      return false;
-    }
+  void ifMayPost(const std::string& uniqueName, const std::function<void()>& post) {
+    const auto caller = callerNamed(uniqueName);
+    _applications.whenKnown(
+        caller,
+        [this, caller, post](const std::string&) {
+          if (_service.mayPost(*caller)) post();
+        },
+        [](const BusFailure&) {});
   }
 
   void nameVanished(sdbus::Message& message) {
@@ -383,12 +444,21 @@ class BusServer::Implementation final : private OwnedConnection,
     _described.appeared(name);
   }
 
+  // Of one application's calls of one method.
+  static constexpr std::size_t mostCallsAtOnce = 2;
+  static constexpr std::size_t mostCallsInLine = 1000;
+
   AccountsService& _service;
   const std::function<void(const std::string&)> _onTrouble;
+  WaitingCalls _calls{mostCallsAtOnce, mostCallsInLine};
   BusLoop _loop;
   BusNotifications _notifications;
   RequestObjects _requests;
   CallerDescriptions _described;
+  CallerApplications _applications{{.service = _service,
+                                    .loop = _loop,
+                                    .processOf = [this](const std::string& name) { return _described.processOf(name); },
+                                    .isHere = [this](const std::string& name) { return isHere(name); }}};
   std::mutex _mutex;
   std::map<std::string, std::shared_ptr<const BusCaller>> _callers;
   std::vector<std::function<void()>> _waitingSignals;

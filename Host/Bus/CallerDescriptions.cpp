@@ -25,6 +25,12 @@ void CallerDescriptions::begin() {
   _connections.wereThere(_questions.names());
 }
 
+pid_t CallerDescriptions::processOf(const std::string& uniqueName) {
+  const auto process = _questions.processOf(uniqueName);
+  if (!process) failAsGone();
+  return *process;
+}
+
 CallingConnection CallerDescriptions::describe(const std::string& uniqueName) {
   const auto connection = _connections.find(uniqueName);
   if (!connection) failAsGone();
@@ -37,12 +43,7 @@ CallingConnection CallerDescriptions::describe(const std::string& uniqueName) {
           .busAddress = _busAddress,
           .existedAt = connection->existedAt,
           .isOlderThanDaemon = connection->isOlderThanDaemon,
-          .askProcessAgain =
-              [this, uniqueName] {
-                const auto process = _questions.processOf(uniqueName);
-                if (!process) failAsGone();
-                return *process;
-              },
+          .askProcessAgain = [this, uniqueName] { return processOf(uniqueName); },
           .listConnections = [this, process = credentials.process](
                                  std::uint64_t sinceTick,
                                  Freshness freshness) { return _connections.madeBy(process, sinceTick, freshness); },

@@ -2,9 +2,9 @@
 
 /// Describes connections to the bus for whoever identifies the process behind one.
 ///
-/// Threads: `describe` may be called from any thread and waits for the bus, as the functions of what it returns do; the rest is
-/// for the thread that reads the bus, and waits for nothing. Ownership: a description borrows this object. Errors: those of
-/// BusQuestions.h; a connection that the bus has not announced is a `BusFailure`.
+/// Threads: `processOf` and `describe` may be called from any thread and wait for the bus, as the functions of a description
+/// do; the rest is for the thread that reads the bus, and waits for nothing. Ownership: a description borrows this object.
+/// Errors: those of BusQuestions.h; a connection that the bus has not announced is a `BusFailure`.
 
 #include <mutex>
 #include <optional>
@@ -25,6 +25,9 @@ class CallerDescriptions {
 
   void appeared(const std::string& name) { _connections.appeared(name); }
   void vanished(const std::string& name) { _connections.vanished(name); }
+
+  /// The process that has made the connection. Waits for the bus.
+  pid_t processOf(const std::string& uniqueName);
 
   CallingConnection describe(const std::string& uniqueName);
 

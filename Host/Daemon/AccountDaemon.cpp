@@ -74,6 +74,9 @@ std::string alertLanguages() {
   return languages;
 }
 
+// Whatever comes now may wait, and the thread that reads the bus never does.
+void letAnotherRead() { BusLoop::handOver(); }
+
 /// Tells grants' clients apart for the store.
 class Directory final : public ClientDirectory {
  public:
@@ -97,7 +100,9 @@ struct AccountDaemon::Parts {
   Parts(const DaemonConfiguration& configuration, SystemAlert* otherAlert)
       : clients(clientRecordFolders(), systemClientRecordFolders()),
         directory(clients),
-        store({.path = stateFolder() / "accounts.sqlite", .onChange = [this](const StoreChange& change) { announce(change); }},
+        store({.path = stateFolder() / "accounts.sqlite",
+               .onChange = [this](const StoreChange& change) { announce(change); },
+               .beforeDisk = letAnotherRead},
               directory),
         log(configuration.logLevel, [this](const AccessRequestRecord& record) { history.append(record, now()); }),
         history(store, [this](const Error& error) { tell(error.description.value_or("The history cannot be written.")); }),
@@ -111,6 +116,7 @@ struct AccountDaemon::Parts {
         social(
             http, outbox, FacebookServer(server), [this] { return firstFacebookAccount(); }, watchExchange),
         preferences(configurationFolder() / "preferences"),
+        queues(letAnotherRead),
         frontEnd({.choice = configuration.alert,
                   .terminal = configuration.terminal,
                   .desktop = {.helper = alertHelper(),
@@ -132,12 +138,14 @@ struct AccountDaemon::Parts {
                  .outbox = outbox,
                  .clients = clients,
                  .coolDown = coolDown,
+                 .alerts = alert,
                  .preferences = preferences,
                  .pluginFor = [this](std::string_view accountType) { return plugins->pluginFor(accountType); },
                  .revocations = [this] { return revocations(); },
                  .status = [this] { return status(); }}),
         pluginLog(log),
-        pluginKeychain(keychain, store, [this](const std::string& clientID) { return service.operationOf(clientID); }),
+        pluginKeychain(keychain, store, coolDown,
+                       [this](const std::string& clientID) { return service.operationOf(clientID); }),
         bus(service, [this](const std::string& sentence) { tell(sentence); }) {
     lock.emplace(stateFolder(), "accountd", patienceWithAnother);
     // Only the one daemon of these stores may repair: another could be in the middle of a grant.
@@ -212,8 +220,6 @@ struct AccountDaemon::Parts {
   }
 
   Dictionary status() {
-    // What is tried takes its time.
-    BusLoop::handOver();
     Array modules;
     for (const std::string& module : plugins->modules()) modules.emplace_back(module);
     Dictionary report{{"plugins", modules},

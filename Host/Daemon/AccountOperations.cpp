@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <future>
 
+#include "Host/Bus/BusLoop.h"
 #include "Host/Daemon/AtEnd.h"
 #include "Host/Daemon/OperationStore.h"
 #include "Host/Daemon/StoreCall.h"
@@ -101,8 +102,13 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
       // Whoever revoked it has taken the note over.
       operation->unlessRevoked([&] { return _parts.store.forgetIntent(AccountType(accountType), client->id()); });
     }
+    // The user of an entitled application is never asked about it, so its failures are none of the user's.
+    const bool mayComeToAnAlert = !client->hasEntitlement(FacebookDefaultAccessEntitlement);
+    if (mayComeToAnAlert && operation->hasKeptServicesBusy() && !operation->wasUserAsked() && !operation->isRevoked()) {
+      _parts.alerts.noteUnshown(*operation);
+    }
     if (!operation->isAnsweredByUser() && result.response != AccessResponse::granted) {
-      _parts.store.removeAnswersByNobodyForClient(*client);
+      if (operation->hasStoredRefusalByNobody()) _parts.store.removeAnswersByNobodyForClient(*client);
       if (operation->isLeftUnanswered()) result.response = AccessResponse::withdrawn;
     }
     if (const auto failure = operation->failure()) throw BusFailure(*failure);
@@ -181,6 +187,12 @@ void AccountOperations::withdraw(const Withdrawable& isMeant) {
   for (const auto& operation : operationsThat(isMeant)) operation->withdraw();
 }
 
+std::optional<std::string> AccountOperations::knownApplication(const BusCaller& caller) {
+  const std::lock_guard lock(_mutex);
+  const auto known = _clientsByConnection.find(caller.uniqueName);
+  return known == _clientsByConnection.end() ? std::nullopt : std::optional(known->second->id());
+}
+
 std::shared_ptr<const RegisteredClient> AccountOperations::clientOf(const BusCaller& caller) {
   {
     const std::lock_guard lock(_mutex);
@@ -189,6 +201,8 @@ std::shared_ptr<const RegisteredClient> AccountOperations::clientOf(const BusCal
     const auto stranger = _strangers.find(caller.uniqueName);
     if (stranger != _strangers.end()) throw BusFailure(BusFailureKind::unknownCaller, stranger->second);
   }
+  // Whose program it is stands on a disk, and which one is the caller's choice.
+  BusLoop::handOver();
   try {
     const auto client = _parts.clients.identify(caller.describe());
     const std::lock_guard lock(_mutex);

@@ -19,6 +19,7 @@
 #include "Host/Accounts/SqliteAccountStore.h"
 #include "Host/Bus/AccountsService.h"
 #include "Host/Daemon/AlertCoolDown.h"
+#include "Host/Daemon/AlertScheduler.h"
 #include "Host/Daemon/ClientLanes.h"
 #include "Host/Daemon/Operation.h"
 #include "Host/Identity/ClientRegistry.h"
@@ -41,6 +42,7 @@ class AccountOperations final : public AccountsService {
     Outbox& outbox;
     const ClientRegistry& clients;
     AlertCoolDown& coolDown;
+    AlertScheduler& alerts;
     TomlPreferencesStore& preferences;
     PluginFinder pluginFor;
     std::function<Rows()> revocations;
@@ -49,6 +51,9 @@ class AccountOperations final : public AccountsService {
 
   explicit AccountOperations(Parts parts) : _parts(std::move(parts)), _lanes(longestLane) {}
 
+  std::optional<std::string> knownApplication(const BusCaller& caller) override;
+  std::string identify(const BusCaller& caller) override { return clientOf(caller)->id(); }
+
   AccessOutcome requestAccess(const BusCaller& caller, const std::string& accountType,
                               const std::shared_ptr<const Dictionary>& accessOptions, PendingRequest& request) override;
   AccessOutcome authorize(const BusCaller& caller, const std::string& accountType, const std::string& client,
@@ -56,6 +61,7 @@ class AccountOperations final : public AccountsService {
   std::string credential(const BusCaller& caller, const std::string& accountType) override;
 
   Rows listAccounts(const BusCaller& caller, const std::string& accountType) override;
+  std::shared_ptr<const void> admitToken(const BusCaller& caller) override;
   std::string addAccount(const BusCaller& caller, const std::string& accountType, const std::string& username,
                          const std::function<std::string()>& readToken) override;
   void removeAccount(const BusCaller& caller, const std::string& id) override;
@@ -110,7 +116,6 @@ class AccountOperations final : public AccountsService {
   std::vector<std::shared_ptr<Operation>> operationsThat(const Withdrawable& areMeant);
   void withdraw(const Withdrawable& isMeant);
   void revokeOperations(const Withdrawable& areMeant);
-  std::string receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken);
   bool hasToken(const AccountRecord& account);
 
   Parts _parts;

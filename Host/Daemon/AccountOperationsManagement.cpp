@@ -19,7 +19,7 @@ namespace palisade {
 namespace {
 
 constexpr std::size_t longestToken = 64 * 1024;
-constexpr std::size_t mostTokenTransfers = 64;
+constexpr std::size_t mostTokenTransfers = 32;
 
 Value textOrNull(const std::optional<std::string>& text) { return text ? Value(*text) : Value(); }
 
@@ -78,7 +78,8 @@ std::string AccountOperations::addAccount(const BusCaller& caller, const std::st
   refuseUnlessManager(caller);
   pluginFor(accountType);
   if (username.empty()) throw BusFailure(BusFailureKind::invalidArguments, "An account needs a user name.");
-  std::string token = receiveToken(caller, readToken);
+  BusLoop::handOver();
+  std::string token = readToken();
   while (token.ends_with('\n') || token.ends_with('\r')) token.pop_back();
   if (token.empty() || token.size() > longestToken) {
     throw BusFailure(BusFailureKind::invalidArguments, "An account needs a token of at most 64 KiB.");
@@ -118,26 +119,21 @@ bool AccountOperations::hasToken(const AccountRecord& account) {
   }
 }
 
-// Each transfer holds a thread and two descriptors, so there are only so many: of a connection, and of all together.
-std::string AccountOperations::receiveToken(const BusCaller& caller, const std::function<std::string()>& readToken) {
-  {
-    const std::lock_guard lock(_mutex);
-    std::size_t all = 0;
-    for (const auto& [connection, count] : _tokenTransfers) all += count;
-    if (all >= mostTokenTransfers || _tokenTransfers[caller.uniqueName] >= longestLane) {
-      throw BusFailure(BusFailureKind::tooManyRequests,
-                       "Too many tokens are being sent. Finish one first, or try again later.");
-    }
-    ++_tokenTransfers[caller.uniqueName];
+// Each transfer holds a thread and four descriptors, so there are only so many: of a connection, and of all together.
+std::shared_ptr<const void> AccountOperations::admitToken(const BusCaller& caller) {
+  const std::lock_guard lock(_mutex);
+  std::size_t all = 0;
+  for (const auto& [connection, count] : _tokenTransfers) all += count;
+  const auto own = _tokenTransfers.find(caller.uniqueName);
+  if (all >= mostTokenTransfers || (own != _tokenTransfers.end() && own->second >= longestLane)) {
+    throw BusFailure(BusFailureKind::tooManyRequests, "Too many tokens are being sent. Finish one first, or try again later.");
   }
-  const AtEnd finished([&] {
-    const std::lock_guard lock(_mutex);
-    const auto transfers = _tokenTransfers.find(caller.uniqueName);
+  ++_tokenTransfers[caller.uniqueName];
+  return std::shared_ptr<const void>(nullptr, [this, connection = caller.uniqueName](const void*) {
+    const std::lock_guard guard(_mutex);
+    const auto transfers = _tokenTransfers.find(connection);
     if (--transfers->second == 0) _tokenTransfers.erase(transfers);
   });
-  // Whoever is refused costs no thread.
-  BusLoop::handOver();
-  return readToken();
 }
 
 void AccountOperations::removeAccount(const BusCaller& caller, const std::string& id) {
@@ -150,7 +146,6 @@ void AccountOperations::removeAccount(const BusCaller& caller, const std::string
   // What was granted belongs to the first account of its type; only that one's removal takes it along.
   const auto first = std::ranges::find(accounts, found->accountTypeIdentifier, &AccountRecord::accountTypeIdentifier);
   if (first == found) revokeAll(caller, found->accountTypeIdentifier);
-  BusLoop::handOver();
   // The account's token signs the invalidations that are still to come, so it goes when they are settled.
   storeCall([&] { _parts.outbox.noteDeparture(id); });
   storeCall([&] { return _parts.store.removeAccount(id); });
@@ -177,7 +172,6 @@ void AccountOperations::revoke(const BusCaller& caller, const std::string& accou
   } else {
     client = registeredClient(clientID);
   }
-  BusLoop::handOver();
   const auto hold = _lanes.hold(clientID);
   revokeOperations([&](const Running& running) { return running.client == clientID; });
   refuseUnlessStored(
@@ -191,7 +185,6 @@ void AccountOperations::revoke(const BusCaller& caller, const std::string& accou
 
 void AccountOperations::revokeAll(const BusCaller& caller, const std::string& accountType) {
   refuseUnlessManager(caller);
-  BusLoop::handOver();
   const auto hold = _lanes.holdAll();
   revokeOperations([](const Running&) { return true; });
   refuseUnlessStored(_parts.store.noteRemovalOfAllClients(AccountType(accountType)));
@@ -278,7 +271,6 @@ std::optional<Value> AccountOperations::preference(const BusCaller& caller, cons
 void AccountOperations::setPreference(const BusCaller& caller, const std::string& domain, const std::string& key,
                                       const std::optional<Value>& value) {
   refuseUnlessManager(caller);
-  BusLoop::handOver();
   preferenceCall([&] { _parts.preferences.set(domain, key, value); });
 }
 

@@ -12,6 +12,16 @@ std::optional<AlertCoolDown::Clock::duration> AlertCoolDown::remainingFor(const 
   return remaining > Clock::duration::zero() ? std::optional(remaining) : std::nullopt;
 }
 
+std::optional<BusFailure> AlertCoolDown::refusalFor(const std::string& application) {
+  const auto remaining = remainingFor(application);
+  if (!remaining) return std::nullopt;
+  const auto minutes = std::chrono::ceil<std::chrono::minutes>(*remaining).count();
+  return BusFailure(
+      BusFailureKind::notAsked,
+      "The user has turned this application's requests down again and again and is not asked about it for now. Ask again in " +
+          std::to_string(minutes) + (minutes == 1 ? " minute." : " minutes."));
+}
+
 bool AlertCoolDown::note(const std::string& application, AlertEnding ending) {
   if (_limits.refusals == 0) return false;
   const std::lock_guard lock(_mutex);

@@ -4,10 +4,11 @@
 ///
 /// An application whose alerts were refused a few times, with no approval between, cools down: until that time is over none of
 /// its alerts may be shown. So it does after many alerts in a row that ended without an answer: nobody has decided anything
-/// then, yet each of them took the keyboard. The counts stand until an approval, so after a cool-down the next refusal begins
-/// another one. What is counted lives as long as the daemon. Threads: safe from every thread. Time is a steady clock's: setting
-/// the date neither ends nor lengthens a cool-down. Ownership: a value that owns its counts, of a bounded number of
-/// applications; the one that was heard of longest ago is forgotten first. Errors: none.
+/// then, yet each of them took the keyboard, or kept keychain and server busy with a question that the user never came to see.
+/// The counts stand until an approval, so after a cool-down the next refusal begins another one. What is counted lives as long
+/// as the daemon. Threads: safe from every thread. Time is a steady clock's: setting the date neither ends nor lengthens a
+/// cool-down. Ownership: a value that owns its counts, of a bounded number of applications; the one that was heard of longest
+/// ago is forgotten first. Errors: none.
 
 #include <chrono>
 #include <cstddef>
@@ -17,13 +18,15 @@
 #include <optional>
 #include <string>
 
+#include "Host/Bus/AccountsService.h"
+
 namespace palisade {
 
-/// How an alert that the user saw came to its end.
+/// How an alert came to its end.
 enum class AlertEnding {
   allowed,
   refused,
-  unanswered  ///< closed, taken down, or gone with its application
+  unanswered  ///< closed, taken down, or gone with its application; or it never stood, for want of an answer of the server's
 };
 
 class AlertCoolDown {
@@ -46,6 +49,9 @@ class AlertCoolDown {
 
   /// How long the application's alerts are not to be shown yet; none when they may be.
   std::optional<Clock::duration> remainingFor(const std::string& application);
+
+  /// The same, as what the application is told.
+  std::optional<BusFailure> refusalFor(const std::string& application);
 
   /// Notes how an alert of the application ended. Answers whether a cool-down begins with it.
   bool note(const std::string& application, AlertEnding ending);

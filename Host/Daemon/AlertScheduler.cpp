@@ -14,14 +14,6 @@ const std::string* applicationOf(const Operation* operation) {
   return operation != nullptr && operation->grant() ? &operation->grant()->clientID : nullptr;
 }
 
-BusFailure coolsDown(AlertCoolDown::Clock::duration remaining) {
-  const auto minutes = std::chrono::ceil<std::chrono::minutes>(remaining).count();
-  return {BusFailureKind::notAsked,
-          "The user has turned this application's requests down again and again and is not asked about it for now. Ask again "
-          "in " +
-              std::to_string(minutes) + (minutes == 1 ? " minute." : " minutes.")};
-}
-
 BusFailure queueIsFull() {
   return {BusFailureKind::notAsked, std::to_string(AlertScheduler::mostWaiting) +
                                         " questions wait for the user already. Ask again when some are answered."};
@@ -62,8 +54,8 @@ std::shared_ptr<AlertHandle> AlertScheduler::createAlert(AlertAllocator allocato
 // Whoever is not shown learns it at once, without waiting for anybody.
 std::shared_ptr<AlertScheduler::Place> AlertScheduler::queueUp(Operation* operation) {
   if (const std::string* application = applicationOf(operation)) {
-    if (const auto remaining = _coolDown.remainingFor(*application)) {
-      operation->fail(coolsDown(*remaining));
+    if (const auto refusal = _coolDown.refusalFor(*application)) {
+      operation->fail(*refusal);
       return nullptr;
     }
   }

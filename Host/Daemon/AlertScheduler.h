@@ -42,6 +42,10 @@ class AlertScheduler final : public SystemAlert {
   int receiveResponse(const std::shared_ptr<AlertHandle>& handle, double timeoutSeconds, AlertResponse& response) override;
   void releaseAlert(std::shared_ptr<AlertHandle> handle) override;
 
+  /// The operation has kept the keychain or the server busy for an alert that never came to stand. For its application that
+  /// counts like an alert without an answer: otherwise it could do so for ever.
+  void noteUnshown(const Operation& operation) { note(&operation, AlertEnding::unanswered); }
+
  private:
   struct Place;
 

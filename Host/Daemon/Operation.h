@@ -66,9 +66,9 @@ class Operation : public std::enable_shared_from_this<Operation> {
   void tokenIsAskedFor(const std::string& appID);
   std::optional<std::string> appOfAskedToken() const;
 
-  /// The server is about to be asked for something that the user has to be asked about afterwards.
-  void serverIsAsked() { _serverAsked.store(true, std::memory_order_release); }
-  bool wasServerAsked() const { return _serverAsked.load(std::memory_order_acquire); }
+  /// The keychain or the server is about to be asked, before the user is.
+  void keepsServicesBusy() { _keepsServicesBusy.store(true, std::memory_order_release); }
+  bool hasKeptServicesBusy() const { return _keepsServicesBusy.load(std::memory_order_acquire); }
 
   /// An alert of the operation stands before the user.
   void userIsAsked() { _userAsked.store(true, std::memory_order_release); }
@@ -81,6 +81,10 @@ class Operation : public std::enable_shared_from_this<Operation> {
   /// An alert of the operation ended without an answer: it was closed or taken down, or there was nobody to ask.
   void alertWentUnanswered() { _wentUnanswered.store(true, std::memory_order_release); }
   bool isLeftUnanswered() const { return isWithdrawn() || _wentUnanswered.load(std::memory_order_acquire); }
+
+  /// A refusal that no user gave is stored for the operation, until it ends.
+  void refusalByNobodyIsStored() { _hasStoredRefusalByNobody.store(true, std::memory_order_release); }
+  bool hasStoredRefusalByNobody() const { return _hasStoredRefusalByNobody.load(std::memory_order_acquire); }
 
   /// A step of the operation could not be stored, or its user is not to be asked: whatever its plug-in answers, it has failed.
   /// The first failure counts.
@@ -101,10 +105,11 @@ class Operation : public std::enable_shared_from_this<Operation> {
   const std::optional<Intent> _grant;
   std::atomic<bool> _isWithdrawn = false;
   std::atomic<bool> _isRevoked = false;
-  std::atomic<bool> _serverAsked = false;
+  std::atomic<bool> _keepsServicesBusy = false;
   std::atomic<bool> _userAsked = false;
   std::atomic<bool> _userAnswered = false;
   std::atomic<bool> _wentUnanswered = false;
+  std::atomic<bool> _hasStoredRefusalByNobody = false;
   mutable std::mutex _mutex;
   std::set<std::shared_ptr<const Interrupt>> _interrupts;
   std::optional<BusFailure> _failure;

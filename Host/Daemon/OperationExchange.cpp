@@ -15,7 +15,7 @@ std::shared_ptr<const void> watchExchange(Exchange exchange) {
       std::move(exchange.cancel), isForToken ? Operation::Interruption::revocation : Operation::Interruption::withdrawal);
   // Whoever revokes from here on knows of the exchange and cancels it.
   if (const auto failure = operation->failure()) throw BusFailure(*failure);
-  if (!isForToken) operation->serverIsAsked();
+  if (!isForToken) operation->keepsServicesBusy();
   operation->aboutToWait();
   return registration;
 }

@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "Host/Accounts/SqliteAccountStore.h"
+#include "Host/Daemon/AlertCoolDown.h"
 #include "Host/Daemon/Operation.h"
 
 namespace palisade {
@@ -16,13 +17,25 @@ std::optional<Error> answered(std::optional<Error> error, BusFailureKind kind, O
 
 }  // namespace
 
-OperationKeychain::OperationKeychain(KeychainManager& keychain, SqliteAccountStore& store, Finder operationOf)
+OperationKeychain::OperationKeychain(KeychainManager& keychain, SqliteAccountStore& store, AlertCoolDown& coolDown,
+                                     Finder operationOf)
     : _keychain(keychain),
       _store(store),
+      _coolDown(coolDown),
       _operationOf(std::move(operationOf)) {}
 
 std::shared_ptr<const AccountCredential> OperationKeychain::credentialForAccount(const std::shared_ptr<Account>& account,
                                                                                  const std::optional<std::string>& clientID) {
+  if (Operation* const operation = Operation::current()) {
+    const bool isUserStillToBeAsked = operation->grant() && !operation->isAnsweredByUser();
+    const auto refusal = isUserStillToBeAsked ? _coolDown.refusalFor(operation->grant()->clientID) : std::nullopt;
+    if (refusal) {
+      operation->fail(*refusal);
+      throw BusFailure(*refusal);
+    }
+    if (isUserStillToBeAsked) operation->keepsServicesBusy();
+    operation->aboutToWait();
+  }
   return _keychain.credentialForAccount(account, clientID);
 }
 

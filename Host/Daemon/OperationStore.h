@@ -46,9 +46,11 @@ class OperationStore final : public AccountStore, public AuthorizationManager {
                    .description = "A grant whose token could not be stored is not recorded."};
     }
     return answered(_operation->unlessRevoked([&] {
-      return authorization.isGranted() || _operation->isAnsweredByUser()
-                 ? _store.setAuthorization(authorization, forClient, onAccountType)
-                 : _store.setAuthorizationAnsweredByNobody(authorization, forClient, onAccountType);
+      if (authorization.isGranted() || _operation->isAnsweredByUser()) {
+        return _store.setAuthorization(authorization, forClient, onAccountType);
+      }
+      _operation->refusalByNobodyIsStored();
+      return _store.setAuthorizationAnsweredByNobody(authorization, forClient, onAccountType);
     }));
   }
 

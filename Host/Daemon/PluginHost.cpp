@@ -6,6 +6,11 @@
 #include "Host/Strings/GettextStringTable.h"
 
 namespace palisade {
+namespace {
+
+constexpr const char* usualTable = "Localizable";
+
+}  // namespace
 
 PluginHost::PluginHost(const std::filesystem::path& folder, const PlatformServices& services) {
   std::error_code error;
@@ -27,6 +32,8 @@ PluginHost::PluginHost(const std::filesystem::path& folder, const PlatformServic
 void PluginHost::load(const std::filesystem::path& module, PlatformServices services) {
   const LoadedPlugin loaded = loadPlugin(module);
   auto strings = std::make_shared<GettextStringTable>(loaded.path.parent_path() / "Resources");
+  // The texts are read while nobody waits: whoever needs the first of them may be the thread that reads the bus.
+  strings->localizedString("any", "", usualTable);
   services.strings = strings.get();
   auto plugin = loaded.module->create(services);
   if (plugin == nullptr) throw PluginLoadError(loaded.path.string() + " made no plug-in object. Rebuild it for this daemon.");

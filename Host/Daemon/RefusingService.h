@@ -21,6 +21,11 @@ class RefusingService final : public AccountsService {
       : _trouble(std::move(trouble)),
         _end(std::move(end)) {}
 
+  // Whoever calls is told the same, so nobody is identified.
+  std::optional<std::string> knownApplication(const BusCaller&) override { return "anybody"; }
+  std::string identify(const BusCaller&) override { return "anybody"; }
+  std::shared_ptr<const void> admitToken(const BusCaller&) override { return nullptr; }
+
   AccessOutcome requestAccess(const BusCaller&, const std::string&, const std::shared_ptr<const Dictionary>&,
                               PendingRequest&) override {
     refuse();

@@ -1,6 +1,8 @@
 // accountd: the account daemon of one user's session.
 
+#include <malloc.h>
 #include <pthread.h>
+#include <sys/resource.h>
 #include <unistd.h>
 
 #include <csignal>
@@ -58,6 +60,18 @@ void stopWhenSignalled(const std::shared_ptr<Serving>& serving, sigset_t signals
     std::this_thread::sleep_for(longestFarewell);
     _exit(0);
   }).detach();
+}
+
+// Many threads wait, and few work at a time: an arena for each would only keep what a crowd of calls once took.
+void shareMemoryAmongThreads() { mallopt(M_ARENA_MAX, 1); }
+
+// A call that waits keeps what descriptors its caller has sent along, asked for or not. The usual soft limit is for programs
+// that still use select(2), which nothing here does.
+void useAllowedDescriptors() {
+  rlimit limit{};
+  if (getrlimit(RLIMIT_NOFILE, &limit) != 0) return;
+  limit.rlim_cur = limit.rlim_max;
+  setrlimit(RLIMIT_NOFILE, &limit);
 }
 
 // The plug-ins that were installed with this daemon, wherever that was.
@@ -122,6 +136,8 @@ int main(int argumentCount, char** arguments) {
       case palisade::CommandLineRequest::serve: break;
     }
     palisade::dropDumpable();
+    useAllowedDescriptors();
+    shareMemoryAmongThreads();
     return trouble ? refuse(*trouble) : serve(configuration);
   } catch (const std::exception& failure) {
     std::cerr << "accountd: " << failure.what() << '\n';

@@ -176,7 +176,7 @@ class Trial:
             if process.poll() is None:
                 process.kill()
             process.wait()
-            for stream in (process.stdout, process.stderr):
+            for stream in (process.stdin, process.stdout, process.stderr):
                 if stream is not None:
                     stream.close()
         self.person.leave()
@@ -198,9 +198,9 @@ class Trial:
                 problems.append(f"{name}, told to end, ended with {daemon.returncode}: {self._log_of(name)}")
         return problems
 
-    def start(self, *command, **more) -> subprocess.Popen:
+    def start(self, *command, input_pipe: bool = False, **more) -> subprocess.Popen:
         process = subprocess.Popen([str(word) for word in command], env=self.environment | more.pop("environment", {}),
-                                   stdin=subprocess.DEVNULL, **more)
+                                   stdin=subprocess.PIPE if input_pipe else subprocess.DEVNULL, **more)
         self._processes.append(process)
         return process
 
@@ -263,6 +263,7 @@ class Trial:
                                  stdout=subprocess.PIPE, stderr=log)
         if not sandbox.stdout.readline():
             raise RuntimeError((self.root / "sandbox.log").read_text(encoding="utf-8"))
+        self.sandbox_process = sandbox
         self.master_token = (self.root / "runtime/palisade-sandbox/master-token").read_bytes()
 
     def add_client(self, name: str, program: str | None = None) -> None:
