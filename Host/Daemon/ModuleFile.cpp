@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "Host/Daemon/PluginLoader.h"
+#include "Host/Files/Exposure.h"
 
 /// The linker's name for the start of the program that this code is linked into, which is its ELF header: what a module has to
 /// agree with.
@@ -24,15 +25,15 @@ namespace {
 
 std::string textForErrno(int number) { return std::generic_category().message(number); }
 
-// Refuses unless only root and this process's user can write. In a sticky folder others cannot replace what is not theirs.
+// Refuses unless only root and this process's user can write. That a folder is sticky does not excuse it: others could put
+// modules of their own beside this one.
 void checkRights(const std::filesystem::path& file, const std::filesystem::path& path, const struct stat& status) {
   const std::string subject = path == file ? "it" : "its folder '" + path.string() + "'";
   if (status.st_uid != 0 && status.st_uid != geteuid()) {
     refuseModule(file, subject + " belongs to another user (user ID " + std::to_string(status.st_uid) + ")",
                  "give it to root with chown after making sure that the module is the one that was installed");
   }
-  const bool isShared = S_ISDIR(status.st_mode) && (status.st_mode & S_ISVTX) != 0;
-  if ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0 && !isShared) {
+  if ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
     refuseModule(file, subject + " is writable by other users",
                  "take that right away with chmod go-w after making sure that the module is the one that was installed");
   }
@@ -147,6 +148,11 @@ void checkModuleFile(const std::filesystem::path& file) {
     refuseModule(file, "its folder cannot be examined (" + textForErrno(errno) + ")", "let the daemon's user enter the folder");
   }
   checkRights(file, folder, status);
+  // Whoever can rename a folder further up can put another one with a module of the same name in its place.
+  if (const auto exposure = exposureAbove(folder)) {
+    refuseModule(file, "the folder '" + exposure->path.string() + "' above it " + exposure->problem,
+                 "run " + exposure->remedy + " after making sure that the module is the one that was installed");
+  }
 
   const ElfW(Ehdr) header = readHeader(file, module);
   checkSegments(file, module, header);

@@ -6,8 +6,8 @@
 
 namespace palisade {
 
-/// Throws `PluginLoadError` unless `file` is a complete shared object for this machine that, like its folder, only root and
-/// this process's user can change. `file` is absolute and without symbolic links.
+/// Throws `PluginLoadError` unless `file` is a complete shared object for this machine that, like its folder and the folders
+/// above, only root and this process's user can change. `file` is absolute and without symbolic links.
 ///
 /// "Complete" covers what the headers describe: every segment, and the section table, which linkers put at the end of the file.
 /// What the segments hold is the dynamic linker's to judge.

@@ -99,13 +99,46 @@ TEST(AModuleThatOthersCanWrite, IsRefused) {
   EXPECT_THAT(refusalOf(file), IsEmpty());
 }
 
-TEST(AModuleInAFolderThatOthersCanWrite, IsRefusedUnlessTheFolderIsSticky) {
+TEST(AModuleInAFolderThatOthersCanWrite, IsRefused) {
   const ModuleFolder folder;
   const std::filesystem::path file = folder.install("good");
-  ASSERT_EQ(chmod(folder.path().c_str(), 0777), 0);
-  EXPECT_THAT(refusalOf(file), HasSubstr("its folder " + quoted(folder.path()) + " is writable by other users"));
-  ASSERT_EQ(chmod(folder.path().c_str(), 01777), 0);
-  EXPECT_THAT(refusalOf(file), IsEmpty());
+  for (const mode_t mode : {0777U, 0775U, 01777U}) {
+    SCOPED_TRACE(mode);
+    ASSERT_EQ(chmod(folder.path().c_str(), mode), 0);
+    EXPECT_THAT(refusalOf(file), HasSubstr("its folder " + quoted(folder.path()) + " is writable by other users"));
+  }
+}
+
+TEST(AModuleBelowAFolderThatOthersCanWrite, IsRefused) {
+  const ModuleFolder folder;
+  const std::filesystem::path below = folder.path() / "above" / "plugins";
+  std::filesystem::create_directories(below);
+  const std::filesystem::path file = below / "good.so";
+  std::filesystem::copy_file(folder.install("good"), file);
+  for (const std::filesystem::path& above : {folder.path() / "above", folder.path()}) {
+    for (const mode_t mode : {0777U, 0775U, 0757U}) {
+      SCOPED_TRACE(mode);
+      ASSERT_EQ(chmod(above.c_str(), mode), 0);
+      EXPECT_THAT(refusalOf(file), AllOf(HasSubstr("the folder " + quoted(above) + " above it is writable by other users"),
+                                         HasSubstr("chmod go-w")));
+    }
+    // There nobody can take the place of a folder of this user's.
+    ASSERT_EQ(chmod(above.c_str(), 01777), 0);
+    EXPECT_THAT(refusalOf(file), IsEmpty());
+    ASSERT_EQ(chmod(above.c_str(), 0755), 0);
+  }
+}
+
+TEST(AModuleBelowAFolderOfAnotherUser, IsRefused) {
+  if (ranWithItsOwnRoot()) return;
+  const ModuleFolder folder;
+  const std::filesystem::path below = folder.path() / "plugins";
+  std::filesystem::create_directories(below);
+  std::filesystem::copy_file(folder.install("good"), below / "good.so");
+  constexpr uid_t somebody = 1;
+  ASSERT_EQ(chown(folder.path().c_str(), somebody, somebody), 0);
+  EXPECT_THAT(refusalOf(below / "good.so"),
+              HasSubstr("the folder " + quoted(folder.path()) + " above it belongs to another user"));
 }
 
 TEST(AModuleOfAnotherUser, IsRefused) {
