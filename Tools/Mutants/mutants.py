@@ -13,6 +13,7 @@ reason in the folder's .toml file beside this script and do not count. The exit 
 import argparse
 import collections
 import concurrent.futures
+import contextlib
 import dataclasses
 import json
 import os
@@ -50,13 +51,43 @@ def say(text):
     print(text, flush=True)
 
 
+@contextlib.contextmanager
+def workers(jobs):
+    """Threads that drop what they have not begun when this script is stopped."""
+    with concurrent.futures.ThreadPoolExecutor(jobs) as pool:
+        try:
+            yield pool
+        except BaseException:
+            pool.shutdown(wait=False, cancel_futures=True)
+            raise
+
+
+def run(command, folder, environment, seconds=None):
+    """Runs a command to its end, or all of it to death when it takes longer or this script is stopped.
+
+    Answers its status, none when it took too long, and its output.
+    """
+    with tempfile.TemporaryFile() as output:
+        process = subprocess.Popen(command, cwd=folder, stdin=subprocess.DEVNULL, stdout=output, stderr=subprocess.STDOUT,
+                                   start_new_session=True, env={**os.environ, **environment})
+        try:
+            status = process.wait(seconds)
+        except subprocess.TimeoutExpired:
+            status = None
+        finally:
+            if process.poll() is None:
+                os.killpg(process.pid, signal.SIGKILL)
+                process.wait()
+        output.seek(0)
+        return status, output.read()
+
+
 def run_quietly(command, name):
     """Runs a step of the build; shows its output when it fails."""
-    with tempfile.TemporaryFile() as output:
-        if subprocess.run(command, cwd=ROOT, stdout=output, stderr=subprocess.STDOUT, check=False).returncode != 0:
-            output.seek(0)
-            sys.stdout.buffer.write(output.read())
-            sys.exit(f"{name} failed.")
+    status, output = run(command, ROOT, {})
+    if status != 0:
+        sys.stdout.buffer.write(output)
+        sys.exit(f"{name} failed.")
 
 
 def build(programs):
@@ -74,20 +105,13 @@ def build(programs):
 def run_tests(program, names, seconds, environment):
     """Runs tests of a program. Answers the first that failed, "" when none did, or "too long"."""
     command = [program, "--gtest_fail_fast", "--gtest_brief=1", "--gtest_color=no", "--gtest_filter=" + ":".join(names)]
-    with tempfile.TemporaryFile() as output:
-        process = subprocess.Popen(command, cwd=program.parent, stdin=subprocess.DEVNULL, stdout=output,
-                                   stderr=subprocess.STDOUT, start_new_session=True, env={**os.environ, **environment})
-        try:
-            status = process.wait(seconds)
-        except subprocess.TimeoutExpired:
-            os.killpg(process.pid, signal.SIGKILL)
-            process.wait()
-            return "too long"
-        if status == 0:
-            return ""
-        output.seek(0)
-        failed = re.search(rb"\[  FAILED  \] ([^\s,]+)", output.read())
-        return failed[1].decode() if failed else f"ended with {status}"
+    status, output = run(command, program.parent, environment, seconds)
+    if status is None:
+        return "too long"
+    if status == 0:
+        return ""
+    failed = re.search(rb"\[  FAILED  \] ([^\s,]+)", output)
+    return failed[1].decode() if failed else f"ended with {status}"
 
 
 def tests_of(program):
@@ -128,7 +152,7 @@ def learn_all(programs, faults, mark, jobs):
                 seconds, reached = known["tests"][test.key()]
                 test.seconds, test.reached = seconds, frozenset(reached)
             return tests
-    with concurrent.futures.ThreadPoolExecutor(jobs) as pool:
+    with workers(jobs) as pool:
         list(pool.map(lambda test: learn(test, len(faults)), tests))
     kept.write_text(json.dumps({"mark": mark,
                                 "tests": {test.key(): [test.seconds, sorted(test.reached)] for test in tests}}))
@@ -178,7 +202,7 @@ def try_faults(hunt, faults, outcomes, keep, jobs):
     names = list(identities(faults))
     left = [(name, fault) for name, fault in zip(names, faults) if name not in outcomes]
     started = time.monotonic()
-    with concurrent.futures.ThreadPoolExecutor(jobs) as pool, keep.open("a", encoding="utf-8") as kept:
+    with workers(jobs) as pool, keep.open("a", encoding="utf-8") as kept:
         futures = {pool.submit(hunt.outcome, fault): name for name, fault in left}
         for count, future in enumerate(concurrent.futures.as_completed(futures), start=1):
             outcomes[futures[future]] = future.result()
@@ -250,6 +274,7 @@ def main():
     parser.add_argument("-j", "--jobs", type=int, default=os.cpu_count(), help="how many tests run at once")
     options = parser.parse_args()
 
+    signal.signal(signal.SIGTERM, lambda *_: sys.exit("Stopped; the next run goes on from here."))
     settings = [tomllib.loads((pathlib.Path(__file__).parent / f"{name}.toml").read_text(encoding="utf-8"))
                 for name in options.folders]
     say("Seeding faults")
