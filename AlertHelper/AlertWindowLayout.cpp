@@ -168,7 +168,6 @@ void AlertWindow::build(const AlertQuestion& question) {
 
 void AlertWindow::fillDetails(const AlertSubject& subject, std::string_view languages) {
   const AlertWords& words = alertWordsFor(languages);
-  const bool isCertain = subject.certainty == AlertCertainty::certain;
   _details.set_column_spacing(gap);
   _details.set_row_spacing(gap / 2);
   std::string spoken;
@@ -186,7 +185,8 @@ void AlertWindow::fillDetails(const AlertSubject& subject, std::string_view lang
   // The identifier has a line of its own, so that each keeps to its side in either direction of writing.
   addRow(words.application, isolatedText(subject.applicationName), "alert-detail");
   if (subject.applicationID != subject.applicationName) addRow("", isolatedText(subject.applicationID), "alert-detail");
-  addRow(words.identity, std::string(isCertain ? words.certain : words.claimed), isCertain ? "alert-certain" : "alert-claimed");
+  addRow(words.identity, std::string(words.wordFor(subject.certainty)),
+         isOnlyClaimed(subject.certainty) ? "alert-claimed" : "alert-certain");
   if (!subject.account.empty()) addRow(words.account, isolatedText(subject.account), "alert-detail");
   makePlace(_details, spoken);
 }

@@ -35,8 +35,7 @@ std::string bodyFor(const AlertSubject& subject, const AlertWords& words) {
   const auto line = [](std::string_view what, const std::string& text) { return std::string(what) + ": " + text; };
   std::string body = line(words.application, isolatedName(subject.applicationName));
   if (subject.applicationID != subject.applicationName) body += "\n" + isolatedName(subject.applicationID);
-  const bool isCertain = subject.certainty == AlertCertainty::certain;
-  body += "\n" + line(words.identity, std::string(isCertain ? words.certain : words.claimed));
+  body += "\n" + line(words.identity, std::string(words.wordFor(subject.certainty)));
   if (!subject.account.empty()) body += "\n" + line(words.account, isolatedName(subject.account));
   return body;
 }

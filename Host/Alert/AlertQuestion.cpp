@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <utility>
 
 #include "Host/Alert/TerminalText.h"
 #include "Host/Json/Json.h"
@@ -33,6 +34,16 @@ bool closesQuotation(std::string_view behind) {
   return std::ranges::any_of(closingMarks, [&](std::string_view mark) { return behind.starts_with(mark); });
 }
 
+constexpr std::array<std::pair<AlertCertainty, std::string_view>, 4> certaintyNames = {
+    {{AlertCertainty::certain, "certain"},
+     {AlertCertainty::likely, "likely"},
+     {AlertCertainty::claimedInSandbox, "claimed in a sandbox"},
+     {AlertCertainty::claimed, "claimed"}}};
+
+std::string_view nameOf(AlertCertainty certainty) {
+  return std::ranges::find(certaintyNames, certainty, [](const auto& entry) { return entry.first; })->second;
+}
+
 // The text of that name; none when it is missing or no text.
 const std::string* textIn(const Dictionary& object, std::string_view name) {
   const Value* value = object.find(name);
@@ -52,7 +63,9 @@ std::optional<AlertSubject> subjectIn(const Dictionary& object) {
       !read(object, "account", subject.account) || !read(object, "identity", certainty)) {
     return std::nullopt;
   }
-  if (certainty == "certain") subject.certainty = AlertCertainty::certain;
+  const auto found = std::ranges::find(certaintyNames, certainty, [](const auto& entry) { return entry.second; });
+  if (found == certaintyNames.end()) return std::nullopt;
+  subject.certainty = found->first;
   return subject;
 }
 
@@ -67,7 +80,7 @@ std::optional<std::string> alertQuestionFrame(const AlertQuestion& question) {
     const AlertSubject& subject = *question.subject;
     object.set("subject", Dictionary{{"name", subject.applicationName},
                                      {"id", subject.applicationID},
-                                     {"identity", subject.certainty == AlertCertainty::certain ? "certain" : "claimed"},
+                                     {"identity", std::string(nameOf(subject.certainty))},
                                      {"account", subject.account}});
   }
   const std::string json = writeJson(object);

@@ -16,9 +16,16 @@ namespace palisade {
 
 /// How much is known about the application that asks.
 enum class AlertCertainty {
-  certain,  ///< a sandbox vouches for it
-  claimed   ///< it runs as the user, like any other program that may pretend to be it
+  certain,           ///< a sandbox vouches for it, and no other program of the user can pretend to be it
+  likely,            ///< a sandbox says so, but a program of the user outside sandboxes could build one that says the same
+  claimedInSandbox,  ///< it is in a sandbox that does not say who is inside
+  claimed            ///< it runs as the user, like any other program that may pretend to be it
 };
+
+/// Whether nobody but the application says who it is.
+inline bool isOnlyClaimed(AlertCertainty certainty) {
+  return certainty == AlertCertainty::claimedInSandbox || certainty == AlertCertainty::claimed;
+}
 
 /// Who asks, and for what account, as the person should see it.
 struct AlertSubject {

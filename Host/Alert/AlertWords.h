@@ -6,6 +6,8 @@
 
 #include <string_view>
 
+#include "Host/Alert/AlertQuestion.h"
+
 namespace palisade {
 
 struct AlertWords {
@@ -15,9 +17,13 @@ struct AlertWords {
   std::string_view identity;
   std::string_view certain;
   std::string_view likely;
+  std::string_view claimedInSandbox;
   std::string_view claimed;
   /// Which keys answer on a terminal.
   std::string_view keys;
+
+  /// What is known about who asks.
+  std::string_view wordFor(AlertCertainty certainty) const;
 
   bool isRightToLeft() const { return language == "ar" || language == "he"; }
 };

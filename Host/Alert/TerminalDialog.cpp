@@ -84,10 +84,9 @@ class Frame {
 void addSubject(Frame& frame, const AlertSubject& subject, const AlertWords& words) {
   const std::size_t labels =
       std::max({columnsOf(words.application), columnsOf(words.identity), columnsOf(words.account)}) + columnGap;
-  const bool isCertain = subject.certainty == AlertCertainty::certain;
   frame.addRow(words.application, labels, subject.applicationName);
   if (subject.applicationID != subject.applicationName) frame.addRow("", labels, subject.applicationID);
-  frame.addRow(words.identity, labels, isCertain ? words.certain : words.claimed, isCertain ? "" : bold);
+  frame.addRow(words.identity, labels, words.wordFor(subject.certainty), isOnlyClaimed(subject.certainty) ? bold : "");
   if (!subject.account.empty()) frame.addRow(words.account, labels, subject.account);
 }
 

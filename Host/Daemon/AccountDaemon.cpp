@@ -16,6 +16,7 @@
 #include "Host/Bus/SessionLock.h"
 #include "Host/Daemon/AccountOperations.h"
 #include "Host/Daemon/AlertScheduler.h"
+#include "Host/Daemon/AlertSubjects.h"
 #include "Host/Daemon/CrashRepair.h"
 #include "Host/Daemon/HealthChecks.h"
 #include "Host/Daemon/Operation.h"
@@ -189,13 +190,9 @@ struct AccountDaemon::Parts {
   /// Who asks through the calling thread, as an alert shows it.
   std::optional<AlertSubject> subject() {
     const Operation* operation = Operation::current();
-    if (operation == nullptr || !operation->grant()) return std::nullopt;
+    if (operation == nullptr || !operation->grant() || operation->client() == nullptr) return std::nullopt;
     const Intent& grant = *operation->grant();
-    AlertSubject subject{.applicationName = std::filesystem::path(grant.clientID).filename(), .applicationID = grant.clientID};
-    if (const auto client = clients.clientWithID(grant.clientID)) {
-      subject.applicationName = client->localizedAppName();
-      if (client->clientClass() == ClientClass::sandboxed) subject.certainty = AlertCertainty::certain;
-    }
+    AlertSubject subject = subjectOf(*operation->client());
     for (const AccountRecord& account : store.accounts()) {
       if (account.accountTypeIdentifier == grant.accountTypeIdentifier && subject.account.empty()) {
         subject.account = account.username;

@@ -51,7 +51,8 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
   const auto plugin = pluginFor(accountType);
   const auto operation = std::make_shared<Operation>(
       [&request] { request.becomePending(); },
-      Intent{.kind = Intent::Kind::grant, .accountTypeIdentifier = accountType, .clientID = client->id(), .appID = appID});
+      Intent{.kind = Intent::Kind::grant, .accountTypeIdentifier = accountType, .clientID = client->id(), .appID = appID},
+      client);
   {
     const std::lock_guard lock(_mutex);
     _running.emplace(

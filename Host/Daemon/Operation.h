@@ -17,6 +17,7 @@
 
 #include "Host/Accounts/Intent.h"
 #include "Host/Bus/AccountsService.h"
+#include "Host/Identity/RegisteredClient.h"
 
 namespace palisade {
 
@@ -24,14 +25,18 @@ class Operation : public std::enable_shared_from_this<Operation> {
  public:
   /// `beforeFirstWait` is called once, on the operation's thread, before it waits for a user or a server.
   /// `grant` is what the operation may come to.
-  explicit Operation(std::function<void()> beforeFirstWait, std::optional<Intent> grant = std::nullopt)
+  /// `client` is who asked for it, as it was identified when it called.
+  explicit Operation(std::function<void()> beforeFirstWait, std::optional<Intent> grant = std::nullopt,
+                     std::shared_ptr<const RegisteredClient> client = nullptr)
       : _beforeFirstWait(std::move(beforeFirstWait)),
-        _grant(std::move(grant)) {}
+        _grant(std::move(grant)),
+        _client(std::move(client)) {}
 
   /// The operation that the calling thread carries, or null.
   static Operation* current();
 
   const std::optional<Intent>& grant() const { return _grant; }
+  const std::shared_ptr<const RegisteredClient>& client() const { return _client; }
 
   /// Notes with `note` what the operation may come to, before anything of it is done. The first call notes; another one, from
   /// whatever thread, waits for that and learns what it answered. Without a grant nothing is noted.
@@ -103,6 +108,7 @@ class Operation : public std::enable_shared_from_this<Operation> {
 
   std::function<void()> _beforeFirstWait;
   const std::optional<Intent> _grant;
+  const std::shared_ptr<const RegisteredClient> _client;
   std::atomic<bool> _isWithdrawn = false;
   std::atomic<bool> _isRevoked = false;
   std::atomic<bool> _keepsServicesBusy = false;

@@ -23,17 +23,19 @@ namespace {
 
 using ClientRef = std::shared_ptr<const RegisteredClient>;
 
-ClientRef clientFrom(const ClientRecord& record, ClientClass clientClass) {
+ClientRef clientFrom(const ClientRecord& record, ClientClass clientClass, bool isBeyondImitation = false) {
   return std::make_shared<const RegisteredClient>(RegisteredClient::Description{.id = record.bundleID,
                                                                                 .bundleID = record.bundleID,
                                                                                 .name = localizedName(record),
                                                                                 .clientClass = clientClass,
                                                                                 .entitlements = record.entitlements,
-                                                                                .recordFile = record.file.string()});
+                                                                                .recordFile = record.file.string(),
+                                                                                .isBeyondImitation = isBeyondImitation});
 }
 
 // A sandboxed application without a record is known by what its sandbox calls it.
-ClientRef clientFromSandbox(const std::string& id, const std::string& desktopFile, ClientClass clientClass) {
+ClientRef clientFromSandbox(const std::string& id, const std::string& desktopFile, ClientClass clientClass,
+                            bool isBeyondImitation) {
   std::string name;
   if (const auto localized = nameInDesktopFile(desktopFile)) name = displayName(textForLocales(*localized, userLocales()));
   return std::make_shared<const RegisteredClient>(RegisteredClient::Description{.id = id,
@@ -41,7 +43,8 @@ ClientRef clientFromSandbox(const std::string& id, const std::string& desktopFil
                                                                                 .name = name.empty() ? id : name,
                                                                                 .clientClass = clientClass,
                                                                                 .entitlements = {},
-                                                                                .recordFile = {}});
+                                                                                .recordFile = {},
+                                                                                .isBeyondImitation = isBeyondImitation});
 }
 
 // What no other ID begins with: paths begin with a slash, and bundle IDs hold no colon.
@@ -65,6 +68,12 @@ ClientRef clientFromProgram(const Program& program, ClientClass clientClass) {
                                                                                 .clientClass = clientClass,
                                                                                 .entitlements = {},
                                                                                 .recordFile = {}});
+}
+
+// Whether the kernel lets no unconfined program take a sandbox's label: elsewhere aa-exec(1) gives any of them to anybody.
+bool keepsLabelsFromOthers() {
+  const FileDescriptor setting(open("/proc/sys/kernel/apparmor_restrict_unprivileged_unconfined", O_RDONLY | O_CLOEXEC));
+  return setting.isOpen() && readAtMost(setting, 16).value_or("").starts_with('1');
 }
 
 // A sandbox hides the session's users, files or processes. Whoever holds the bus sees them; the daemon may see less than that.
@@ -105,30 +114,31 @@ struct ClientRegistry::Implementation {
   }
 
   ClientRef sandboxed(std::optional<std::string> ClientMatch::*kind, const std::string& kindKey, const std::string& id,
-                      const std::string& desktopFile, ClientClass clientClass) const {
+                      const std::string& desktopFile, ClientClass clientClass, bool isBeyondImitation) const {
     if (const ClientRecord* fitting = record([&](const ClientMatch& match) { return match.*kind == id; })) {
-      return clientFrom(*fitting, clientClass);
+      return clientFrom(*fitting, clientClass, isBeyondImitation);
     }
     // Anybody can call a sandboxed application what a record calls another one.
     if (const ClientRecord* other = recordWithID(id)) {
       throw IdentityError("The sandboxed caller is called '" + id + "' like the application of " + other->file.string() +
                           ", which does not recognise it. If it is the same, add " + kindKey + " = \"" + id + "\" to [match].");
     }
-    return clientFromSandbox(id, desktopFile, clientClass);
+    return clientFromSandbox(id, desktopFile, clientClass, isBeyondImitation);
   }
 
   ClientRef clientBehind(const PinnedProcess& caller, pid_t busProcess) const {
     if (const auto info = caller.flatpakInfo()) {
       const std::string id = flatpakApplicationID(*info);
-      return sandboxed(&ClientMatch::flatpak, "flatpak", id, id + ".desktop", ClientClass::sandboxed);
+      return sandboxed(&ClientMatch::flatpak, "flatpak", id, id + ".desktop", ClientClass::sandboxed, false);
     }
 
     auto snap = snapOfLabel(caller.securityLabel().value_or(""));
+    const bool isBeyondImitation = snap && keepsLabelsFromOthers();
     if (!snap) snap = snapOfCgroups(caller.cgroups());
     if (snap) {
       const std::string desktopFile = snap->name + "_" + snap->application + ".desktop";
       const auto clientClass = snap->isConfined ? ClientClass::sandboxed : ClientClass::unit;
-      return sandboxed(&ClientMatch::snap, "snap", snap->name, desktopFile, clientClass);
+      return sandboxed(&ClientMatch::snap, "snap", snap->name, desktopFile, clientClass, isBeyondImitation);
     }
 
     const Program program = caller.program();

@@ -34,12 +34,15 @@ class RegisteredClient final : public Client {
     std::vector<std::string> entitlements;
     /// The record's file; empty for a program without one.
     std::string recordFile;
+    /// Whether no program of the user outside sandboxes can look like it.
+    bool isBeyondImitation = false;
   };
 
   explicit RegisteredClient(Description description) : _description(std::move(description)) {}
 
   const std::string& id() const { return _description.id; }
   ClientClass clientClass() const { return _description.clientClass; }
+  bool isBeyondImitation() const { return _description.isBeyondImitation; }
   /// Whether a sandbox confines it, of whatever kind. Then it manages nothing.
   bool isInSandbox() const {
     return _description.clientClass == ClientClass::sandboxed || _description.clientClass == ClientClass::unknownSandbox;

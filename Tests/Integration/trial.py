@@ -78,6 +78,8 @@ class Person:
         # "allow", "refuse", "close" or "nothing"; may change while an alert stands.
         self.answer = answer
         self.alerts = 0
+        # The alert that was seen last, as it was drawn.
+        self.dialog = ""
         self._selected = None
         self._changed = threading.Condition()
         self._screen, self._terminal = pty.openpty()
@@ -117,6 +119,7 @@ class Person:
                 continue
             for dialog, is_new in seen.read(os.read(self._screen, 1 << 16).decode(errors="replace")):
                 self._selected = selected_button(dialog)
+                self.dialog = dialog
                 if is_new:
                     self._meet_alert()
                 if self.answer in ("allow", "refuse") and self._selected != self.answer:

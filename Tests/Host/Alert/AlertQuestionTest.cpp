@@ -47,6 +47,17 @@ TEST(AQuestion, ComesBackWhole) {
   EXPECT_EQ(read->subject->account, "ada");
 }
 
+TEST(AQuestion, KeepsHowMuchIsKnownAboutWhoAsks) {
+  for (const AlertCertainty certainty :
+       {AlertCertainty::certain, AlertCertainty::likely, AlertCertainty::claimedInSandbox, AlertCertainty::claimed}) {
+    AlertQuestion question = example();
+    question.subject->certainty = certainty;
+    const auto read = readBack(alertQuestionFrame(question).value());
+    ASSERT_TRUE(read && read->subject);
+    EXPECT_EQ(read->subject->certainty, certainty);
+  }
+}
+
 TEST(AQuestion, MayLeaveOpenWhoAsks) {
   AlertQuestion question = example();
   question.subject.reset();
