@@ -6,7 +6,7 @@ import pathlib
 import unittest
 
 import trial
-from accounts import FACEBOOK, GRANTED
+from accounts import GRANTED
 from text_test import ASK_FOR_ACCESS
 
 trial.use_build_of_command_line()
@@ -39,16 +39,23 @@ class WhoAsks(unittest.TestCase):
         # Whoever is outside sandboxes can build one that says the same.
         self.assertIn("Likely (sandboxed)", dialog)
 
-    def test_is_each_caller_of_one_record_by_itself(self):
-        record = self.session.clients / "org.example.photos.toml"
-        record.write_text(record.read_text(encoding="utf-8") + 'flatpak = "org.example.Sandboxed"\n', encoding="utf-8")
+    def let_sandboxed_in(self):
+        """The record of a program recognises a sandboxed application, too."""
+        with open(self.session.clients / "org.example.photos.toml", "a", encoding="utf-8") as record:
+            record.write('flatpak = "org.example.Sandboxed"\n')
         self.start()
+
+    def test_is_the_sandboxed_caller_of_a_record_that_lets_a_program_in_as_well(self):
+        self.let_sandboxed_in()
         dialog = self.alert_of_sandboxed("org.example.Sandboxed")
         self.assertRegex(dialog, "Application +Photos")
         self.assertIn("Likely (sandboxed)", dialog)
+
+    def test_is_the_program_of_a_record_that_lets_a_sandboxed_caller_in_as_well(self):
+        self.let_sandboxed_in()
         with self.session.caller() as caller:
-            caller.manage("Revoke", "ss", [FACEBOOK, "org.example.photos"])
             self.assertEqual(caller.start_request().outcome()[0], GRANTED)
+        self.assertRegex(self.session.person.dialog, "Application +Photos")
         self.assertIn("Only claimed (not sandboxed)", self.session.person.dialog)
 
 
