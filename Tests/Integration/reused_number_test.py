@@ -225,6 +225,6 @@ class AConnectionOfADeadProcessOnABusThatPins(DeadProcesses):
 
 
 if __name__ == "__main__":
-    trial.use_build_of_command_line()
     take_numbers_of_our_own()
+    trial.use_build_of_command_line()
     unittest.main(verbosity=2)
