@@ -267,6 +267,9 @@ void AccountsClient::notify(const std::string& name) {
     auto signal = object->createSignal("com.veltran.Notify1", "Posted");
     signal << name;
     object->emitSignal(signal);
+    // The daemon asks the bus who has posted, which has to be there still. It answers in order, so that it knows by this
+    // answer.
+    if (_bus->hasOwner(busName)) _bus->manager().ListGrants("nothing", {});
   });
 }
 
