@@ -44,7 +44,7 @@ def question(language, **subject):
         "allow": table("ACCOUNT_ACCESS_ALLOW_BUTTON_TITLE"),
         "refuse": table("ACCOUNT_ACCESS_DO_NOT_ALLOW_BUTTON_TITLE"),
         "languages": language,
-        "subject": {"name": name, "id": "org.example.photos", "identity": "certain", "account": "ada@example.org", **subject},
+        "subject": {"name": name, "id": "org.example.photos", "identity": "likely", "account": "ada@example.org", **subject},
     }
 
 
