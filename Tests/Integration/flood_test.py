@@ -157,6 +157,7 @@ class ManyApplications(unittest.TestCase):
         for process in ended():
             self.assertIn("8 questions wait for the user already. Ask again when some are answered.",
                           process.stdout.read().decode())
+        session.person.wait_for_alert(1)
         self.assertEqual(session.person.alerts, 1)
 
         for number in range(1, MOST_WAITING + 2):
