@@ -41,9 +41,6 @@ void makeFolder(const std::filesystem::path& path) {
 void replaceFile(const std::filesystem::path& path, const std::string& text) {
   const std::filesystem::path unfinished = path.string() + ".new";
   if (!(std::ofstream(unfinished) << text)) throw std::runtime_error("Cannot write " + unfinished.string() + ".");
-  // The daemons refuse configuration that others may write, whatever this user's files are like otherwise.
-  using std::filesystem::perms;
-  std::filesystem::permissions(unfinished, perms::owner_read | perms::owner_write | perms::group_read | perms::others_read);
   std::filesystem::rename(unfinished, path);
 }
 

@@ -1,10 +1,14 @@
 #include "Host/Files/Exposure.h"
 
+#include <grp.h>
+#include <pwd.h>
 #include <unistd.h>
 
+#include <array>
 #include <cerrno>
 #include <cstring>
 #include <fstream>
+#include <string_view>
 #include <system_error>
 
 namespace palisade {
@@ -21,6 +25,23 @@ std::optional<uid_t> ownerOfUnmapped() {
   std::ifstream overflow("/proc/sys/kernel/overflowuid");
   uid_t owner = 0;
   return overflow >> owner ? std::optional(owner) : std::nullopt;
+}
+
+// Many systems give each user a group of the user's name, without other members, and let that group write what the user makes.
+bool isPrivateGroupOfThisUser(gid_t group) {
+  std::array<char, 4096> userTexts{};
+  std::array<char, 4096> groupTexts{};
+  passwd userEntry{};
+  ::group groupEntry{};
+  passwd* user = nullptr;
+  ::group* found = nullptr;
+  if (getpwuid_r(geteuid(), &userEntry, userTexts.data(), userTexts.size(), &user) != 0 || user == nullptr) return false;
+  if (getgrgid_r(group, &groupEntry, groupTexts.data(), groupTexts.size(), &found) != 0 || found == nullptr) return false;
+  if (user->pw_gid != group || std::string_view(user->pw_name) != found->gr_name) return false;
+  for (char** member = found->gr_mem; *member != nullptr; ++member) {
+    if (std::string_view(*member) != user->pw_name) return false;
+  }
+  return true;
 }
 
 std::string quoted(const std::filesystem::path& path) { return "'" + path.string() + "'"; }
@@ -65,6 +86,9 @@ std::optional<Exposure> exposureAbove(const std::filesystem::path& path) {
     struct stat status {};
     if (stat(folder.c_str(), &status) != 0) return unexaminable(folder);
     if ((status.st_mode & S_ISVTX) != 0) status.st_mode &= ~static_cast<mode_t>(S_IWGRP | S_IWOTH);
+    if ((status.st_mode & S_IWGRP) != 0 && isPrivateGroupOfThisUser(status.st_gid)) {
+      status.st_mode &= ~static_cast<mode_t>(S_IWGRP);
+    }
     if (const auto exposure = exposureOf(folder, status)) return exposure;
     if (folder == folder.root_path()) return std::nullopt;
   }

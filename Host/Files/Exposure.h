@@ -28,7 +28,7 @@ std::optional<Exposure> exposureOf(const std::filesystem::path& path, const stru
 std::optional<Exposure> exposureOfFile(const std::filesystem::path& file);
 
 /// Of every folder above `path`, which is absolute and without links. In a sticky one others cannot take the place of what is
-/// not theirs.
+/// not theirs, and a group that is this user's alone has nobody else in it.
 std::optional<Exposure> exposureAbove(const std::filesystem::path& path);
 
 }  // namespace palisade

@@ -116,7 +116,7 @@ TEST(AModuleBelowAFolderThatOthersCanWrite, IsRefused) {
   const std::filesystem::path file = below / "good.so";
   std::filesystem::copy_file(folder.install("good"), file);
   for (const std::filesystem::path& above : {folder.path() / "above", folder.path()}) {
-    for (const mode_t mode : {0777U, 0775U, 0757U}) {
+    for (const mode_t mode : {0777U, 0757U}) {
       SCOPED_TRACE(mode);
       ASSERT_EQ(chmod(above.c_str(), mode), 0);
       EXPECT_THAT(refusalOf(file), AllOf(HasSubstr("the folder " + quoted(above) + " above it is writable by other users"),
@@ -127,6 +127,20 @@ TEST(AModuleBelowAFolderThatOthersCanWrite, IsRefused) {
     EXPECT_THAT(refusalOf(file), IsEmpty());
     ASSERT_EQ(chmod(above.c_str(), 0755), 0);
   }
+}
+
+TEST(AModuleBelowAFolderThatAGroupCanWrite, IsRefusedUnlessTheGroupIsItsUsersAlone) {
+  if (ranWithItsOwnRoot()) return;
+  const ModuleFolder folder;
+  const std::filesystem::path below = folder.path() / "plugins";
+  std::filesystem::create_directories(below);
+  const std::filesystem::path file = below / "good.so";
+  std::filesystem::copy_file(folder.install("good"), file);
+  ASSERT_EQ(chmod(folder.path().c_str(), 0775), 0);
+  EXPECT_THAT(refusalOf(file), IsEmpty());
+  constexpr gid_t ofOthers = 1;
+  ASSERT_EQ(chown(folder.path().c_str(), 0, ofOthers), 0);
+  EXPECT_THAT(refusalOf(file), HasSubstr("the folder " + quoted(folder.path()) + " above it is writable by other users"));
 }
 
 TEST(AModuleBelowAFolderOfAnotherUser, IsRefused) {

@@ -183,7 +183,7 @@ TEST(TheFileThatIsInstalled, ShowsEverySettingAsItCanBeWritten) {
 
   const std::optional<Dictionary> table = readTomlFile(uncommented);
   ASSERT_TRUE(table);
-  EXPECT_THAT(*table, SizeIs(7));
+  EXPECT_THAT(*table, SizeIs(8));
   DaemonConfiguration configuration;
   EXPECT_NO_THROW(applyConfigurationFile(*table, configuration));
 }
