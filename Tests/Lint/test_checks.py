@@ -49,6 +49,8 @@ BROKEN = [
         "cycle: Host/B.h -> Host/C.h -> Host/B.h",
     ),
     ("file_length", {"Host/A.cpp": "//\n" * 601}, "Host/A.cpp: 601 lines"),
+    ("named_tests", {"Docs/a.md": "Refused.\n[`ATest`, `Integration.Gone`]\n", "Tests/ATest.cpp": "TEST(ATest, Runs) {}\n"},
+     "Docs/a.md:2: names the test Integration.Gone"),
     ("format", {"Host/A.cpp": "int  main( ) { }\n", ".clang-format": "BasedOnStyle: Google\n"}, "Host/A.cpp:1:4: error"),
 ]
 
