@@ -56,7 +56,8 @@ void* allocated(void* memory) {
 }  // namespace
 }  // namespace palisade
 
-// The standard library's other forms of new and delete end in these.
+// The standard library's other forms of new and delete end in these. In optimised code GCC takes a delete that it has inlined
+// for the wrong partner of a new that it has not.
 
 void* operator new(std::size_t size) {
   if (palisade::failsNow()) throw std::bad_alloc();
@@ -69,7 +70,7 @@ void* operator new(std::size_t size, std::align_val_t alignment) {
   return palisade::allocated(std::aligned_alloc(boundary, (size + boundary - 1) / boundary * boundary));
 }
 
-void operator delete(void* memory) noexcept { std::free(memory); }
-void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
-void operator delete(void* memory, std::align_val_t) noexcept { std::free(memory); }
-void operator delete(void* memory, std::size_t, std::align_val_t) noexcept { std::free(memory); }
+[[gnu::noinline]] void operator delete(void* memory) noexcept { std::free(memory); }
+[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
+[[gnu::noinline]] void operator delete(void* memory, std::align_val_t) noexcept { std::free(memory); }
+[[gnu::noinline]] void operator delete(void* memory, std::size_t, std::align_val_t) noexcept { std::free(memory); }
