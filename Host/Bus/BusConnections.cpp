@@ -2,7 +2,9 @@
 
 #include <unistd.h>
 
+#include <algorithm>
 #include <ctime>
+#include <iterator>
 
 namespace palisade {
 namespace {
@@ -39,7 +41,7 @@ void BusConnections::appeared(const std::string& name) {
 
 void BusConnections::vanished(const std::string& name) {
   const std::lock_guard lock(_mutex);
-  _connections.erase(name);
+  if (_connections.erase(name) > 0) _oneHasEnded.notify_all();
 }
 
 std::optional<BusConnections::Connection> BusConnections::find(const std::string& uniqueName) const {
@@ -48,17 +50,16 @@ std::optional<BusConnections::Connection> BusConnections::find(const std::string
   return found == _connections.end() ? std::nullopt : std::optional(found->second);
 }
 
-std::vector<std::string> BusConnections::madeBy(pid_t process, std::uint64_t sinceTick, Freshness freshness) {
+std::vector<std::string> BusConnections::madeBy(pid_t process, std::uint64_t sinceTick) {
   std::vector<std::string> made;
   std::vector<std::string> toAsk;
   {
     const std::lock_guard lock(_mutex);
     for (const auto& [name, connection] : _connections) {
       if (connection.existedAt < sinceTick) continue;
-      const bool isItsOwn = connection.process == process;
-      if (!connection.process || (isItsOwn && freshness == Freshness::asked)) {
+      if (!connection.process) {
         toAsk.push_back(name);
-      } else if (isItsOwn) {
+      } else if (connection.process == process) {
         made.push_back(name);
       }
     }
@@ -73,9 +74,24 @@ std::vector<std::string> BusConnections::madeBy(pid_t process, std::uint64_t sin
       found->second.process = answer;
     } else {
       _connections.erase(found);
+      _oneHasEnded.notify_all();
     }
   }
   return made;
+}
+
+std::vector<std::string> BusConnections::awaitEnd(const std::vector<std::string>& uniqueNames,
+                                                  std::chrono::steady_clock::time_point deadline) {
+  std::vector<std::string> left;
+  const auto hasOneEnded = [&] {
+    left.clear();
+    std::copy_if(uniqueNames.begin(), uniqueNames.end(), std::back_inserter(left),
+                 [&](const std::string& name) { return _connections.contains(name); });
+    return left.size() < uniqueNames.size();
+  };
+  std::unique_lock lock(_mutex);
+  _oneHasEnded.wait_until(lock, deadline, hasOneEnded);
+  return left;
 }
 
 void BusConnections::confirm(const std::vector<std::string>& uniqueNames, std::uint64_t startTick) {

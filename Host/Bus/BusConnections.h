@@ -5,11 +5,13 @@
 /// The bus announces each new name; the moment at which that is heard is noted in the kernel's own unit for the starts of
 /// processes, clock ticks since the machine came up. The connection is a little older than that. Connections that were there
 /// before the daemon listened share one moment. What is kept ends with the connection, so the bus's own limits bound it.
-/// Threads: every operation may be called from any thread; `madeBy` asks the bus and holds nothing meanwhile. Errors: those of
-/// the question.
+/// Threads: every operation may be called from any thread; `madeBy` asks the bus and holds nothing meanwhile, and `awaitEnd`
+/// waits. Errors: those of the question.
 
 #include <sys/types.h>
 
+#include <chrono>
+#include <condition_variable>
 #include <cstdint>
 #include <functional>
 #include <mutex>
@@ -52,8 +54,13 @@ class BusConnections {
   std::optional<Connection> find(const std::string& uniqueName) const;
 
   /// The connections that the bus counts for a process, without those that are known to have existed before `sinceTick`: a
-  /// process that started then has not made them.
-  std::vector<std::string> madeBy(pid_t process, std::uint64_t sinceTick, Freshness freshness);
+  /// process that started then has not made them. One that has just ended may still be among them.
+  std::vector<std::string> madeBy(pid_t process, std::uint64_t sinceTick);
+
+  /// Waits until one of the connections has ended, at most until the deadline. Returns those that have not ended. The thread
+  /// that calls `vanished` must not call this.
+  std::vector<std::string> awaitEnd(const std::vector<std::string>& uniqueNames,
+                                    std::chrono::steady_clock::time_point deadline);
 
   /// All of these were made by the process that has their number and started at that tick.
   void confirm(const std::vector<std::string>& uniqueNames, std::uint64_t startTick);
@@ -62,6 +69,7 @@ class BusConnections {
   const AskProcess _askProcess;
   const std::function<std::uint64_t()> _now;
   mutable std::mutex _mutex;
+  std::condition_variable _oneHasEnded;
   std::unordered_map<std::string, Connection> _connections;
 };
 

@@ -45,8 +45,11 @@ CallingConnection CallerDescriptions::describe(const std::string& uniqueName) {
           .isOlderThanDaemon = connection->isOlderThanDaemon,
           .askProcessAgain = [this, uniqueName] { return processOf(uniqueName); },
           .listConnections = [this, process = credentials.process](
-                                 std::uint64_t sinceTick,
-                                 Freshness freshness) { return _connections.madeBy(process, sinceTick, freshness); },
+                                 std::uint64_t sinceTick) { return _connections.madeBy(process, sinceTick); },
+          .awaitEnd =
+              [this](const std::vector<std::string>& connections, std::chrono::steady_clock::time_point deadline) {
+                return _connections.awaitEnd(connections, deadline);
+              },
           .ownerStart = connection->ownerStart,
           .confirm = [this](const std::vector<std::string>& connections,
                             std::uint64_t startTick) { _connections.confirm(connections, startTick); }};

@@ -16,6 +16,7 @@
 #include <set>
 #include <string_view>
 #include <system_error>
+#include <utility>
 #include <vector>
 
 // The kernel is asked about one socket at a time, by its inode. That costs a microsecond or two each; a list of all sockets of
@@ -23,8 +24,6 @@
 
 namespace palisade {
 namespace {
-
-using Inode = std::uint32_t;
 
 bool isSameFile(const FileDescriptor& folder, const char* name, const char* other) {
   struct stat one {};
@@ -34,10 +33,10 @@ bool isSameFile(const FileDescriptor& folder, const char* name, const char* othe
 }
 
 // The inodes of the sockets that the process holds; none when they cannot be listed.
-std::optional<std::vector<Inode>> socketsOf(const FileDescriptor& processFolder) {
+std::optional<std::vector<SocketInode>> socketsOf(const FileDescriptor& processFolder) {
   const FileDescriptor folder(openat(processFolder.number(), "fd", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   if (!folder.isOpen()) return std::nullopt;
-  std::vector<Inode> sockets;
+  std::vector<SocketInode> sockets;
   std::error_code error;
   const std::filesystem::path path = "/proc/self/fd/" + std::to_string(folder.number());
   for (std::filesystem::directory_iterator entry(path, error), end; !error && entry != end; entry.increment(error)) {
@@ -46,7 +45,7 @@ std::optional<std::vector<Inode>> socketsOf(const FileDescriptor& processFolder)
     constexpr std::string_view beginning = "socket:[";
     if (length <= static_cast<ssize_t>(beginning.size())) continue;
     const std::string_view text(target.data(), static_cast<std::size_t>(length));
-    Inode inode = 0;
+    SocketInode inode = 0;
     if (!text.starts_with(beginning)) continue;
     if (std::from_chars(text.data() + beginning.size(), text.data() + text.size(), inode).ec == std::errc()) {
       sockets.push_back(inode);
@@ -57,7 +56,7 @@ std::optional<std::vector<Inode>> socketsOf(const FileDescriptor& processFolder)
 }
 
 struct SocketFacts {
-  std::optional<Inode> peer;
+  std::optional<SocketInode> peer;
   std::string address;
 };
 
@@ -73,11 +72,11 @@ class SocketDiagnosis {
     const FileDescriptor one(pair[0]);
     const FileDescriptor other(pair[1]);
     struct stat status {};
-    return fstat(one.number(), &status) == 0 && about(static_cast<Inode>(status.st_ino)).has_value();
+    return fstat(one.number(), &status) == 0 && about(static_cast<SocketInode>(status.st_ino)).has_value();
   }
 
   // None for a socket of another kind or another network.
-  std::optional<SocketFacts> about(Inode inode) {
+  std::optional<SocketFacts> about(SocketInode inode) {
     struct {
       nlmsghdr header;
       unix_diag_req body;
@@ -115,8 +114,8 @@ class SocketDiagnosis {
       if (attribute.nla_len < sizeof(attribute) || place + attribute.nla_len > message.size()) return std::nullopt;
       const std::string_view content = message.substr(place + NLA_HDRLEN, attribute.nla_len - NLA_HDRLEN);
       if (attribute.nla_type == UNIX_DIAG_NAME) facts.address = content;
-      if (attribute.nla_type == UNIX_DIAG_PEER && content.size() == sizeof(Inode)) {
-        Inode peer = 0;
+      if (attribute.nla_type == UNIX_DIAG_PEER && content.size() == sizeof(SocketInode)) {
+        SocketInode peer = 0;
         std::memcpy(&peer, content.data(), sizeof(peer));
         facts.peer = peer;
       }
@@ -131,39 +130,41 @@ class SocketDiagnosis {
   std::uint32_t _sequence = 0;
 };
 
-std::set<Inode> socketsOfBus(pid_t busProcess) {
+std::set<SocketInode> socketsOfBus(pid_t busProcess) {
   const FileDescriptor folder(open(("/proc/" + std::to_string(busProcess)).c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
   if (!folder.isOpen()) return {};
   const auto sockets = socketsOf(folder);
-  return sockets ? std::set<Inode>(sockets->begin(), sockets->end()) : std::set<Inode>();
+  return sockets ? std::set<SocketInode>(sockets->begin(), sockets->end()) : std::set<SocketInode>();
 }
 
 }  // namespace
 
-std::optional<std::size_t> countSocketsToBus(const FileDescriptor& processFolder, const std::string& busAddress,
-                                             pid_t busProcess, std::size_t enough) {
+std::optional<std::set<SocketInode>> socketsToBus(const FileDescriptor& processFolder, const std::string& busAddress,
+                                                  pid_t busProcess, std::size_t enough) {
   if (!isSameFile(processFolder, "ns/net", "/proc/self/ns/net")) return std::nullopt;
   const auto sockets = socketsOf(processFolder);
   SocketDiagnosis diagnosis;
   if (!sockets || !diagnosis.works()) return std::nullopt;
 
-  std::size_t count = 0;
-  std::vector<Inode> otherPeers;
-  for (const Inode socket : *sockets) {
-    if (count >= enough) return count;
+  std::set<SocketInode> toBus;
+  std::vector<std::pair<SocketInode, SocketInode>> others;  // with the other end of each
+  for (const SocketInode socket : *sockets) {
+    if (toBus.size() >= enough) return toBus;
     const auto facts = diagnosis.about(socket);
     if (!facts || !facts->peer) continue;
     const auto peer = diagnosis.about(*facts->peer);
     if (peer && !busAddress.empty() && peer->address == busAddress) {
-      ++count;
+      toBus.insert(socket);
     } else {
-      otherPeers.push_back(*facts->peer);
+      others.emplace_back(socket, *facts->peer);
     }
   }
-  if (count >= enough || otherPeers.empty()) return count;
-  const std::set<Inode> heldByBus = socketsOfBus(busProcess);
-  for (const Inode peer : otherPeers) count += heldByBus.count(peer);
-  return count;
+  if (toBus.size() >= enough || others.empty()) return toBus;
+  const std::set<SocketInode> heldByBus = socketsOfBus(busProcess);
+  for (const auto& [socket, peer] : others) {
+    if (heldByBus.contains(peer)) toBus.insert(socket);
+  }
+  return toBus;
 }
 
 }  // namespace palisade

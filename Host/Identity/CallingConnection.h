@@ -7,6 +7,7 @@
 
 #include <sys/types.h>
 
+#include <chrono>
 #include <cstdint>
 #include <functional>
 #include <memory>
@@ -17,12 +18,6 @@
 #include "Host/Files/FileDescriptor.h"
 
 namespace palisade {
-
-/// How much what is known about the bus's connections may lag behind.
-enum class Freshness {
-  asHeard,  ///< a connection that has just gone may still be counted
-  asked     ///< the bus is asked about each connection again
-};
 
 struct CallingConnection {
   /// The number and the user of the process that made the connection, as they were at that moment.
@@ -46,7 +41,12 @@ struct CallingConnection {
   /// The number of the connection's process once more; throws when the connection is gone.
   std::function<pid_t()> askProcessAgain = nullptr;
   /// The connections that the bus counts for this process, without those that are known to have existed before that tick.
-  std::function<std::vector<std::string>(std::uint64_t sinceTick, Freshness freshness)> listConnections = nullptr;
+  /// One that has just ended may still be among them.
+  std::function<std::vector<std::string>(std::uint64_t sinceTick)> listConnections = nullptr;
+  /// Waits until one of the connections has ended, at most until the deadline. Returns those that have not ended.
+  std::function<std::vector<std::string>(const std::vector<std::string>& connections,
+                                         std::chrono::steady_clock::time_point deadline)>
+      awaitEnd = nullptr;
 
   /// When the process started that was found to have made this connection; none before that is found.
   std::optional<std::uint64_t> ownerStart = std::nullopt;

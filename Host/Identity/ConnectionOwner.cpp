@@ -2,16 +2,25 @@
 
 #include <unistd.h>
 
+#include <chrono>
+#include <cstddef>
 #include <exception>
+#include <limits>
+#include <set>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "Host/Identity/BusSockets.h"
 
 namespace palisade {
 namespace {
 
-// A process that closes a connection has one socket less at once, and the bus hears of it a moment later.
-constexpr int looks = 4;
+// A child that was forked and has not run its program yet holds every connection of its parent for a moment, on a busy machine
+// for many moments. Nobody waits for the refusal but the callers of this one process.
+constexpr auto patience = std::chrono::seconds(2);
+
+constexpr std::size_t everySocket = std::numeric_limits<std::size_t>::max();
 
 std::string startAgain() { return " Start the application again."; }
 
@@ -59,19 +68,34 @@ void requireNotYounger(std::uint64_t start, const CallingConnection& connection)
                          std::to_string(connection.process) + " now." + startAgain());
 }
 
+// The sockets are always looked at after the connections were listed: a connection that is closed in between is then still
+// counted, and its socket is not. Only the bus can end that, so only the end of a connection is waited for.
 void requireEnoughSockets(const PinnedProcess& caller, std::uint64_t start, const CallingConnection& connection) {
   if (connection.ownerStart == start) return;
-  for (int look = 0; look < looks; ++look) {
-    const auto counted = connection.listConnections(start, look == 0 ? Freshness::asHeard : Freshness::asked);
-    const auto held = countSocketsToBus(caller.folder(), connection.busAddress, connection.busProcess, counted.size());
-    if (held && *held >= counted.size()) return connection.confirm(counted, start);
-    if (held) continue;
+  const auto look = [&](std::size_t enough) {
+    return socketsToBus(caller.folder(), connection.busAddress, connection.busProcess, enough);
+  };
+  const auto deadline = std::chrono::steady_clock::now() + patience;
+  auto counted = connection.listConnections(start);
+  auto held = look(counted.size());
+  if (!held) {
     if (!connection.isOlderThanDaemon) return;
     throw NotItsConnection(
         "The caller's connection is older than the account daemon, and the kernel does not tell whose it is." + startAgain());
   }
-  throw NotItsConnection("The bus counts more connections for process " + std::to_string(connection.process) +
-                         " than it has: one of them was made by a process that has ended." + startAgain());
+  while (held->size() < counted.size()) {
+    auto left = connection.awaitEnd(counted, deadline);
+    if (left.size() == counted.size()) {
+      throw NotItsConnection("The bus counts more connections for process " + std::to_string(connection.process) +
+                             " than it has: the process that made one of them has ended, or another process keeps one that " +
+                             "was closed." + startAgain());
+    }
+    counted = std::move(left);
+    if (held->size() < counted.size()) continue;
+    const auto heldNow = look(everySocket).value_or(std::set<SocketInode>());
+    std::erase_if(*held, [&](SocketInode socket) { return !heldNow.contains(socket); });
+  }
+  connection.confirm(counted, start);
 }
 
 }  // namespace

@@ -5,7 +5,9 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <chrono>
 #include <csignal>
+#include <future>
 #include <map>
 
 #include "Host/Identity/PinnedProcess.h"
@@ -13,6 +15,7 @@
 namespace palisade {
 namespace {
 
+using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::UnorderedElementsAre;
 using Connection = BusConnections::Connection;
@@ -66,17 +69,17 @@ TEST_F(TheConnectionsOfABus, AreNoNamesOfServices) {
   connections.appeared("org.example.Album");
   EXPECT_EQ(connections.find("org.example.Photos"), std::nullopt);
   EXPECT_EQ(connections.find("org.example.Album"), std::nullopt);
-  EXPECT_THAT(connections.madeBy(photos, 0, Freshness::asked), IsEmpty());
+  EXPECT_THAT(connections.madeBy(photos, 0), IsEmpty());
 }
 
 TEST_F(TheConnectionsOfABus, AreCountedByTheProcessThatTheBusNames) {
   processes = {{":1.1", photos}, {":1.2", album}, {":1.3", photos}};
   connections.wereThere({":1.1", ":1.2"});
   connections.appeared(":1.3");
-  EXPECT_THAT(connections.madeBy(photos, 0, Freshness::asHeard), UnorderedElementsAre(":1.1", ":1.3"));
+  EXPECT_THAT(connections.madeBy(photos, 0), UnorderedElementsAre(":1.1", ":1.3"));
   EXPECT_THAT(asked, UnorderedElementsAre(":1.1", ":1.2", ":1.3"));
   asked.clear();
-  EXPECT_THAT(connections.madeBy(album, 0, Freshness::asHeard), UnorderedElementsAre(":1.2"));
+  EXPECT_THAT(connections.madeBy(album, 0), UnorderedElementsAre(":1.2"));
   EXPECT_THAT(asked, IsEmpty()) << "the process behind a connection does not change";
 }
 
@@ -87,21 +90,40 @@ TEST_F(TheConnectionsOfABus, ThatExistedBeforeTheProcessStartedAreNotCountedForI
   connections.appeared(":1.2");
   now = 1002;
   connections.appeared(":1.3");
-  EXPECT_THAT(connections.madeBy(photos, 1001, Freshness::asHeard), UnorderedElementsAre(":1.2", ":1.3"))
+  EXPECT_THAT(connections.madeBy(photos, 1001), UnorderedElementsAre(":1.2", ":1.3"))
       << "in the tick of its start it may have connected";
   EXPECT_THAT(asked, UnorderedElementsAre(":1.2", ":1.3"));
 }
 
-TEST_F(TheConnectionsOfABus, ThatHaveJustEndedAreNotCountedWhenTheBusIsAskedAgain) {
-  processes = {{":1.1", photos}, {":1.2", photos}, {":1.3", album}};
+TEST_F(TheConnectionsOfABus, ThatHaveEndedAreLeftOutAtOnce) {
   for (const char* name : {":1.1", ":1.2", ":1.3"}) connections.appeared(name);
-  EXPECT_THAT(connections.madeBy(photos, 0, Freshness::asHeard), UnorderedElementsAre(":1.1", ":1.2"));
-  processes.erase(":1.2");
-  EXPECT_THAT(connections.madeBy(photos, 0, Freshness::asHeard), UnorderedElementsAre(":1.1", ":1.2"));
-  asked.clear();
-  EXPECT_THAT(connections.madeBy(photos, 0, Freshness::asked), UnorderedElementsAre(":1.1"));
-  EXPECT_THAT(asked, UnorderedElementsAre(":1.1", ":1.2"));
-  EXPECT_EQ(connections.find(":1.2"), std::nullopt);
+  connections.vanished(":1.2");
+  EXPECT_THAT(connections.awaitEnd({":1.1", ":1.2", ":1.3"}, std::chrono::steady_clock::time_point::max()),
+              ElementsAre(":1.1", ":1.3"));
+}
+
+TEST_F(TheConnectionsOfABus, AreWaitedForUntilOneOfThemHasEnded) {
+  for (const char* name : {":1.1", ":1.2", ":1.3"}) connections.appeared(name);
+  auto left = std::async(std::launch::async, [&] {
+    return connections.awaitEnd({":1.1", ":1.2"}, std::chrono::steady_clock::time_point::max());
+  });
+  connections.vanished(":1.3");
+  EXPECT_EQ(left.wait_for(std::chrono::milliseconds(20)), std::future_status::timeout) << "another connection has ended";
+  connections.vanished(":1.1");
+  EXPECT_THAT(left.get(), ElementsAre(":1.2"));
+}
+
+TEST_F(TheConnectionsOfABus, AreWaitedForUntilTheBusDoesNotKnowOneOfThem) {
+  connections.appeared(":1.1");
+  auto left = std::async(std::launch::async,
+                         [&] { return connections.awaitEnd({":1.1"}, std::chrono::steady_clock::time_point::max()); });
+  EXPECT_THAT(connections.madeBy(photos, 0), IsEmpty());
+  EXPECT_THAT(left.get(), IsEmpty());
+}
+
+TEST_F(TheConnectionsOfABus, AreAllLeftWhenTheDeadlineComesFirst) {
+  connections.appeared(":1.1");
+  EXPECT_THAT(connections.awaitEnd({":1.1"}, std::chrono::steady_clock::now()), ElementsAre(":1.1"));
 }
 
 TEST_F(TheConnectionsOfABus, AreRememberedAsAProcesssOwn) {

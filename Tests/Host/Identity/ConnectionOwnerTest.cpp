@@ -9,9 +9,11 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <chrono>
 #include <cstddef>
 #include <cstring>
 #include <filesystem>
+#include <optional>
 #include <stdexcept>
 #include <vector>
 
@@ -62,13 +64,17 @@ class Listener {
 
 FileDescriptor ownFolder() { return FileDescriptor(open("/proc/self", O_PATH | O_DIRECTORY | O_CLOEXEC)); }
 
+std::size_t countSocketsToBus(const std::string& address, pid_t busProcess, std::size_t enough) {
+  return socketsToBus(ownFolder(), address, busProcess, enough).value().size();
+}
+
 TEST(TheSocketsToTheBus, AreCountedByTheirOtherEnd) {
   const TemporaryFolder folder;
   for (const std::string& address :
        {(folder.path() / "bus").string(), std::string("\0palisade-test.", 15) + folder.path().string()}) {
     const Listener bus(address);
     const Listener stranger(address + "x");
-    EXPECT_EQ(countSocketsToBus(ownFolder(), address, 0, 9), 0U);
+    EXPECT_EQ(countSocketsToBus(address, 0, 9), 0U);
     const FileDescriptor one = bus.connectOnce();
     const FileDescriptor another = bus.connectOnce();
     const FileDescriptor elsewhere = stranger.connectOnce();
@@ -78,9 +84,9 @@ TEST(TheSocketsToTheBus, AreCountedByTheirOtherEnd) {
     const FileDescriptor takenElsewhere = stranger.acceptOnce();
     // Nobody has answered this one.
     const FileDescriptor waiting = bus.connectOnce();
-    EXPECT_EQ(countSocketsToBus(ownFolder(), address, 0, 9), 2U);
-    EXPECT_EQ(countSocketsToBus(ownFolder(), address, 0, 1), 1U);
-    EXPECT_EQ(countSocketsToBus(ownFolder(), "", 0, 9), 0U);
+    EXPECT_EQ(countSocketsToBus(address, 0, 9), 2U);
+    EXPECT_EQ(countSocketsToBus(address, 0, 1), 1U);
+    EXPECT_EQ(countSocketsToBus("", 0, 9), 0U);
   }
 }
 
@@ -90,7 +96,7 @@ TEST(TheSocketsToTheBus, AreThoseThatItsProcessHoldsWhateverTheirAddress) {
   const FileDescriptor connected = bus.connectOnce();
   const FileDescriptor taken = bus.acceptOnce();
   // Either end is the other's, and both are this process's.
-  EXPECT_EQ(countSocketsToBus(ownFolder(), "/run/bus", getpid(), 9), 2U);
+  EXPECT_EQ(countSocketsToBus("/run/bus", getpid(), 9), 2U);
 }
 
 class AConnectionOfACaller : public testing::Test {
@@ -123,38 +129,82 @@ TEST_F(AConnectionOfACaller, IsNotItsOwnWhenItIsOlderThanTheCaller) {
   expectRefusal(connection, "has ended; another one has its number");
 }
 
-TEST_F(AConnectionOfACaller, IsNotItsOwnWhenTheBusCountsMoreThanItHas) {
-  std::vector<Freshness> looks;
-  connection.listConnections = [&](std::uint64_t sinceTick, Freshness freshness) {
+TEST_F(AConnectionOfACaller, IsNotItsOwnWhenTheBusGoesOnToCountMoreThanItHas) {
+  connection.listConnections = [&](std::uint64_t sinceTick) {
     EXPECT_EQ(sinceTick, start);
-    looks.push_back(freshness);
+    return Names{":1.5", ":1.6"};
+  };
+  std::vector<Names> waits;
+  connection.awaitEnd = [&](const Names& names, std::chrono::steady_clock::time_point deadline) {
+    EXPECT_GT(deadline, std::chrono::steady_clock::now() + std::chrono::seconds(1));
+    EXPECT_LE(deadline, std::chrono::steady_clock::now() + std::chrono::seconds(2));
+    waits.push_back(names);
     return Names{":1.5"};
   };
   connection.confirm = [](const Names&, std::uint64_t) { ADD_FAILURE() << "confirmed"; };
   expectRefusal(connection, "The bus counts more connections for process " + std::to_string(caller.pid()) + " than it has");
-  ASSERT_GT(looks.size(), 1U);
-  EXPECT_EQ(looks.front(), Freshness::asHeard);
-  EXPECT_EQ(looks.back(), Freshness::asked);
+  EXPECT_THAT(waits, testing::ElementsAre(Names{":1.5", ":1.6"}, Names{":1.5"}));
 }
 
-TEST_F(AConnectionOfACaller, IsItsOwnWhenAnotherOneOfItsConnectionsHasJustEnded) {
-  connection.listConnections = [](std::uint64_t, Freshness freshness) {
-    return freshness == Freshness::asHeard ? Names{":1.5"} : Names{};
-  };
+TEST_F(AConnectionOfACaller, IsItsOwnWhenTheBusNoticesThatItsOtherConnectionsHaveEnded) {
+  connection.listConnections = [](std::uint64_t) { return Names{":1.5", ":1.6"}; };
+  connection.awaitEnd = [](const Names& names, auto) { return Names(names.begin() + 1, names.end()); };
   expectItsOwn(connection);
 }
 
-TEST_F(AConnectionOfACaller, IsExaminedOnceWithAllThatTheCallerHas) {
-  const Listener bus(std::string("\0palisade-test.", 15) + std::to_string(getpid()));
+// This process is the caller, and the listener is the bus.
+class ACallerWithSockets : public AConnectionOfACaller {
+ protected:
+  ACallerWithSockets() {
+    connection = connectionOf(getpid());
+    // Not this process, which holds both ends.
+    connection.busProcess = caller.pid();
+    connection.busAddress = bus.address();
+  }
+
+  const Listener bus{std::string("\0palisade-test.", 15) + std::to_string(getpid())};
+};
+
+TEST_F(ACallerWithSockets, DoesNotOwnAConnectionByASocketThatItGainsWhileTheBusIsWaitedFor) {
+  std::vector<FileDescriptor> gained;
+  connection.listConnections = [](std::uint64_t) { return Names{":1.5", ":1.6"}; };
+  connection.awaitEnd = [&](const Names& names, auto) {
+    gained.push_back(bus.connectOnce());
+    gained.push_back(bus.acceptOnce());
+    return Names{names.back()};
+  };
+  expectRefusal(connection, "counts more connections");
+  EXPECT_EQ(gained.size(), 4U);
+}
+
+TEST_F(ACallerWithSockets, DoesNotOwnAConnectionByASocketThatItClosesWhileTheBusIsWaitedFor) {
+  auto closed = std::make_optional(bus.connectOnce());
+  const FileDescriptor taken = bus.acceptOnce();
+  connection.listConnections = [](std::uint64_t) { return Names{":1.5", ":1.6"}; };
+  connection.awaitEnd = [&](const Names& names, auto) {
+    closed.reset();
+    return Names{names.back()};
+  };
+  expectRefusal(connection, "counts more connections");
+}
+
+TEST_F(ACallerWithSockets, OwnsItsConnectionWhenItClosesAnotherOneBetweenTheTwoLooks) {
+  const FileDescriptor kept = bus.connectOnce();
+  const FileDescriptor taken = bus.acceptOnce();
+  connection.listConnections = [](std::uint64_t) { return Names{":1.5", ":1.6"}; };
+  connection.awaitEnd = [](const Names& names, auto) { return Names{names.back()}; };
+  Names confirmed;
+  connection.confirm = [&](const Names& names, std::uint64_t) { confirmed = names; };
+  expectItsOwn(connection);
+  EXPECT_THAT(confirmed, testing::ElementsAre(":1.6"));
+}
+
+TEST_F(ACallerWithSockets, IsExaminedOnceWithAllItsConnections) {
   const FileDescriptor one = bus.connectOnce();
   const FileDescriptor another = bus.connectOnce();
   const FileDescriptor takenOne = bus.acceptOnce();
   const FileDescriptor takenAnother = bus.acceptOnce();
-  connection = connectionOf(getpid());
-  // Not this process, which holds both ends.
-  connection.busProcess = caller.pid();
-  connection.busAddress = bus.address();
-  connection.listConnections = [](std::uint64_t, Freshness) { return Names{":1.5", ":1.6"}; };
+  connection.listConnections = [](std::uint64_t) { return Names{":1.5", ":1.6"}; };
   Names confirmed;
   connection.confirm = [&](const Names& names, std::uint64_t startTick) {
     confirmed = names;
@@ -163,7 +213,7 @@ TEST_F(AConnectionOfACaller, IsExaminedOnceWithAllThatTheCallerHas) {
   expectItsOwn(connection);
   EXPECT_THAT(confirmed, testing::ElementsAre(":1.5", ":1.6"));
 
-  connection.listConnections = [](std::uint64_t, Freshness) { return Names{":1.5", ":1.6", ":1.7"}; };
+  connection.listConnections = [](std::uint64_t) { return Names{":1.5", ":1.6", ":1.7"}; };
   expectItsOwn(connection);
   // What was found about another process says nothing about this one.
   ++*connection.ownerStart;
@@ -190,7 +240,7 @@ TEST_F(AConnectionOfACaller, IsItsOwnUnderItsSecurityLabel) {
 TEST_F(AConnectionOfACaller, ThatTheBusHasPinnedNeedsNoOtherSign) {
   connection.pin = std::make_shared<const FileDescriptor>(static_cast<int>(syscall(SYS_pidfd_open, caller.pid(), 0)));
   connection.existedAt = 0;
-  connection.listConnections = [](std::uint64_t, Freshness) { return Names{":1.5"}; };
+  connection.listConnections = [](std::uint64_t) { return Names{":1.5"}; };
   expectItsOwn(connection);
 }
 

@@ -19,7 +19,8 @@ inline palisade::CallingConnection connectionOf(pid_t process) {
           .busProcess = getpid(),
           .existedAt = UINT64_MAX,
           .askProcessAgain = [process] { return process; },
-          .listConnections = [](std::uint64_t, palisade::Freshness) { return std::vector<std::string>(); },
+          .listConnections = [](std::uint64_t) { return std::vector<std::string>(); },
+          .awaitEnd = [](const std::vector<std::string>& connections, auto) { return connections; },
           .confirm = [](const std::vector<std::string>&, std::uint64_t) {}};
 }
 
