@@ -12,6 +12,7 @@
 #include <system_error>
 #include <utility>
 
+#include "Host/Bus/AccountsService.h"
 #include "Host/Secrets/Wipe.h"
 
 namespace palisade {
@@ -73,18 +74,22 @@ void BusLoop::handOver(std::function<void()> first) {
 }
 
 void BusLoop::giveUpLead(std::function<void()> first) {
-  ledLoop = nullptr;
-  {
-    const std::lock_guard lock(_mutex);
-    _hasLeader = false;
-    if (_isStopping) return;
+  const std::lock_guard lock(_mutex);
+  if (!_isStopping) {
+    if (_parked == 0) addFollower();
     _posted.push_front(std::move(first));
-    if (_parked == 0) {
-      _followers.emplace_back([this] { serve(); });
-      return;
-    }
+    _leadIsFree.notify_one();
   }
-  _leadIsFree.notify_one();
+  _hasLeader = false;
+  ledLoop = nullptr;
+}
+
+void BusLoop::addFollower() {
+  try {
+    _followers.emplace_back([this] { serve(); });
+  } catch (const std::system_error&) {
+    throw BusFailure(BusFailureKind::tooManyRequests, "There is no thread left for this call. Try again later.");
+  }
 }
 
 void BusLoop::serve() {

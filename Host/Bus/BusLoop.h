@@ -46,7 +46,7 @@ class BusLoop {
   void post(std::function<void()> work);
 
   /// Lets another thread read the bus, after it has run `first`. Any thread but the leader runs `first` itself, and that is
-  /// all.
+  /// all. A `BusFailure` when there is no such thread: this one is the leader then as before.
   static void handOver(std::function<void()> first = [] {});
 
   /// Has the leader look at the connection again: there may be something to send.
@@ -61,6 +61,7 @@ class BusLoop {
   void carryOut(const std::function<void()>& work);
   void waitForMessages();
   void giveUpLead(std::function<void()> first);
+  void addFollower();
 
   sdbus::IConnection& _connection;
   const std::function<void(const std::string&)> _onTrouble;

@@ -9,9 +9,18 @@ namespace palisade {
 void CallerApplications::whenKnown(const CallerRef& caller, const GoOn& goOn, const Refuse& refuse) {
   if (const auto application = _parts.service.knownApplication(*caller)) return goOn(*application);
   try {
-    if (isFirstToWait(*caller, {.goOn = goOn, .refuse = refuse})) _newcomers.run("", [this, caller] { findProcess(caller); });
+    if (!isFirstToWait(*caller, {.goOn = goOn, .refuse = refuse})) return;
   } catch (const BusFailure& failure) {
-    refuse(failure);
+    return refuse(failure);
+  }
+  inLine(_newcomers, "", caller, &CallerApplications::findProcess);
+}
+
+void CallerApplications::inLine(WaitingCalls& lines, const std::string& name, const CallerRef& caller, Step step) {
+  try {
+    lines.run(name, [this, caller, step] { (this->*step)(caller); });
+  } catch (const BusFailure& failure) {
+    tell(caller, failure);
   }
 }
 
@@ -29,7 +38,7 @@ bool CallerApplications::isFirstToWait(const BusCaller& caller, Call call) {
 void CallerApplications::findProcess(const CallerRef& caller) {
   try {
     const std::string process = std::to_string(_parts.processOf(caller->uniqueName));
-    _parts.loop.post([this, caller, process] { _identifications.run(process, [this, caller] { identify(caller); }); });
+    _parts.loop.post([this, caller, process] { inLine(_identifications, process, caller, &CallerApplications::identify); });
   } catch (const BusFailure& failure) {
     tell(caller, failure);
   } catch (const std::exception& failure) {

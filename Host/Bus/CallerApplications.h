@@ -56,7 +56,10 @@ class CallerApplications {
   using CallerRef = std::shared_ptr<const BusCaller>;
   using Finding = std::variant<std::string, BusFailure>;
 
+  using Step = void (CallerApplications::*)(const CallerRef& caller);
+
   bool isFirstToWait(const BusCaller& caller, Call call);
+  void inLine(WaitingCalls& lines, const std::string& name, const CallerRef& caller, Step step);
   void findProcess(const CallerRef& caller);
   void identify(const CallerRef& caller);
   void tell(const CallerRef& caller, const Finding& finding);

@@ -117,11 +117,17 @@ void BusRequest::becomePending() {
     const std::lock_guard lock(_mutex);
     _isPending = true;
   }
-  // The thread that carries the request goes on with it meanwhile.
-  BusLoop::handOver([request = shared_from_this()] {
-    const std::lock_guard lock(request->_mutex);
-    request->announce();
-  });
+  try {
+    // The thread that carries the request goes on with it meanwhile.
+    BusLoop::handOver([request = shared_from_this()] {
+      const std::lock_guard lock(request->_mutex);
+      request->announce();
+    });
+  } catch (const BusFailure&) {
+    const std::lock_guard lock(_mutex);
+    _isPending = false;
+    throw;
+  }
 }
 
 void BusRequest::announce() {

@@ -28,9 +28,14 @@ void WaitingCalls::run(const std::string& line, std::function<void()> call) {
       _mostWaiting = std::max(_mostWaiting, ++_waiting);
       return;
     }
+    try {
+      BusLoop::handOver();
+    } catch (const BusFailure&) {
+      if (own.running == 0) _lines.erase(line);
+      throw;
+    }
     ++own.running;
   }
-  BusLoop::handOver();
   for (auto next = std::move(call); next != nullptr; next = nextOf(line)) next();
 }
 

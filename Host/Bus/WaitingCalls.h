@@ -5,7 +5,7 @@
 /// Of the calls of one line a few run at once, on a thread each; the others stand in the line without one. Whose calls share a
 /// line is up to the caller: an application that has filled its own delays nobody else's.
 /// Threads: `run` from any thread; a call runs on the calling thread, or on that of a call before it. Ownership: owns what
-/// waits. Errors: `BusFailure` for a call that finds its line full.
+/// waits. Errors: `BusFailure` for a call that finds its line full, or no thread to run on.
 
 #include <cstddef>
 #include <deque>

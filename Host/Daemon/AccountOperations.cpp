@@ -90,11 +90,17 @@ AccessOutcome AccountOperations::carryOut(const BusCaller& caller, const std::sh
            outcome->set_value(result);
          });
     if (answer.wait_for(std::chrono::seconds(0)) != std::future_status::ready) {
-      operation->aboutToWait();
-      // The user has agreed and the server is at work: a token that it issues from here on is taken back if this daemon dies.
-      if (operation->isAnsweredByUser())
-        operation->noteGrant([&](const Intent& grant) { return _parts.store.noteIntent(grant); });
-      if (operation->wasUserAsked()) _parts.history.flush();
+      try {
+        operation->aboutToWait();
+        // The user has agreed and the server is at work: a token that it issues from here on is taken back if this daemon dies.
+        if (operation->isAnsweredByUser())
+          operation->noteGrant([&](const Intent& grant) { return _parts.store.noteIntent(grant); });
+        if (operation->wasUserAsked()) _parts.history.flush();
+      } catch (const BusFailure& failure) {
+        // The plug-in is at work and its answer has to be waited for; nothing may come of it.
+        operation->fail(failure);
+        operation->revoke();
+      }
     }
     AccessOutcome result = answer.get();
 

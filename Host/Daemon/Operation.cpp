@@ -21,7 +21,14 @@ OperationScope::OperationScope(Operation& operation) { currentOperation = &opera
 OperationScope::~OperationScope() { currentOperation = nullptr; }
 
 void Operation::aboutToWait() {
-  if (const auto first = std::exchange(_beforeFirstWait, nullptr)) first();
+  const auto first = std::exchange(_beforeFirstWait, nullptr);
+  if (!first) return;
+  try {
+    first();
+  } catch (const BusFailure& failure) {
+    fail(failure);
+    throw;
+  }
 }
 
 std::optional<Error> Operation::noteGrant(const std::function<std::optional<Error>(const Intent&)>& note) {

@@ -43,7 +43,7 @@ class Operation : public std::enable_shared_from_this<Operation> {
   std::optional<Error> noteGrant(const std::function<std::optional<Error>(const Intent&)>& note);
   bool hasNotedGrant() const;
 
-  /// The operation may wait for long from here on.
+  /// The operation may wait for long from here on. What `beforeFirstWait` throws is passed on, and fails the operation.
   void aboutToWait();
 
   /// Ends what the operation waits for, now or later; from then on nobody will answer it. Does not wait.

@@ -14,7 +14,7 @@ import unittest
 
 import trial
 from accounts import FACEBOOK, GRANTED, PENDING, REFUSED
-from bus_wire import PATIENCE, BusError
+from bus_wire import IS_SANITIZED, PATIENCE, BusError
 from trial import wait_until
 
 trial.use_build_of_command_line()
@@ -262,6 +262,40 @@ class ADaemonWithFewDescriptors(unittest.TestCase):
         with self.assertRaises(BusError) as refused:
             caller.reply_to(serial).answer()
         return refused.exception.name
+
+
+@unittest.skipIf(IS_SANITIZED, "A sanitizer needs all the addresses there are.")
+class ADaemonWithoutAThreadToSpare(unittest.TestCase):
+    TOO_SMALL_FOR_A_STACK = 1 << 20
+
+    def test_refuses_what_needs_one_and_serves_everybody_when_there_is_one_again(self):
+        with trial.Trial(log="error") as session, session.caller() as greedy, session.caller() as newcomer:
+            session.start_accountd()
+            session.add_account()
+            self.assertTrue(greedy.manage("GetStatus"))
+            unlimited = self.leave_no_thread(session.accountd.pid)
+            reading, writing = os.pipe()
+            held = [greedy.start("AddAccount", "ssha{sv}", [FACEBOOK, str(number), 0, {}], descriptors=[reading])
+                    for number in range(8)]
+            os.close(reading)
+            for ask in (lambda: greedy.reply_to(held[-1]).answer(), lambda: newcomer.manage("GetStatus"),
+                        lambda: newcomer.start_request().outcome()):
+                with self.assertRaisesRegex(BusError, "no thread left"):
+                    ask()
+            self.assertEqual(greedy.start_request().outcome()[0], REFUSED)
+            resource.prlimit(session.accountd.pid, resource.RLIMIT_AS, unlimited)
+            os.close(writing)
+            self.assertTrue(newcomer.manage("GetStatus"))
+            self.assertEqual(newcomer.start_request().outcome()[0], GRANTED)
+            with session.caller() as another:
+                self.assertTrue(another.manage("GetStatus"))
+
+    def leave_no_thread(self, process: int) -> tuple[int, int]:
+        status = pathlib.Path(f"/proc/{process}/status").read_text(encoding="utf-8")
+        addresses = int(re.search(r"VmSize:\s*(\d+) kB", status)[1]) * 1024
+        unlimited = resource.prlimit(process, resource.RLIMIT_AS)
+        resource.prlimit(process, resource.RLIMIT_AS, (addresses + self.TOO_SMALL_FOR_A_STACK, unlimited[1]))
+        return unlimited
 
 
 class Changes(unittest.TestCase):

@@ -21,6 +21,13 @@ TEST(AnOperation, AnnouncesItsFirstWaitOnce) {
   operation.aboutToWait();
 }
 
+TEST(AnOperation, HasFailedWhenItsFirstWaitCannotBeAnnounced) {
+  Operation operation([] { throw BusFailure(BusFailureKind::tooManyRequests, "There is no thread left."); });
+  EXPECT_THROW(operation.aboutToWait(), BusFailure);
+  ASSERT_TRUE(operation.failure());
+  EXPECT_EQ(operation.failure()->kind(), BusFailureKind::tooManyRequests);
+}
+
 TEST(AnOperation, AnnouncesNothingWhenItNeverWaits) {
   MockFunction<void()> announce;
   EXPECT_CALL(announce, Call).Times(0);
