@@ -10,7 +10,7 @@ import xml.etree.ElementTree
 
 # How each framework says it: GoogleTest after the place, Python's unittest behind the test's name, our own scripts in a line.
 REASONS = (
-    re.compile(r"^\S+:\d+: Skipped\n(?P<reason>.+?)\n$", re.MULTILINE | re.DOTALL),
+    re.compile(r"^\S+:\d+: Skipped\n(?P<reason>.+?)\n(?:$|\[)", re.MULTILINE | re.DOTALL),
     re.compile(r"^(?P<part>test_\w+).*?\.\.\. skipped ['\"](?P<reason>.*)['\"]$", re.MULTILINE),
     re.compile(r"^Skipped: (?P<reason>.*)$", re.MULTILINE),
 )
@@ -23,7 +23,7 @@ def skipped(case: xml.etree.ElementTree.Element) -> "list[tuple[str, str]]":
     for pattern in REASONS:
         for match in pattern.finditer(output):
             part = match.groupdict().get("part")
-            found.append((f"{name}: {part}" if part else name, " ".join(match["reason"].split())))
+            found.append((f"{name}: {part}" if part else name, " ".join(match["reason"].replace(r"\n", " ").split())))
     if not found and case.find("skipped") is not None:
         found.append((name, "it does not say why"))
     return found

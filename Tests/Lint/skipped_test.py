@@ -14,10 +14,9 @@ REPORT = """<?xml version="1.0" encoding="UTF-8"?>
 Tests/DiskTest.cpp:41: Skipped
 no disk can be
 mounted here
-
 [  SKIPPED ] ADisk.IsFull (0 ms)
 </system-out></testcase>
-  <testcase name="Integration.Faults"><system-out>test_of_a_clock (__main__.AClock.test_of_a_clock) ... skipped 'there is no clock'
+  <testcase name="Integration.Faults"><system-out>test_of_a_clock (__main__.AClock.test_of_a_clock) ... skipped 'there is no\\nclock\\n'
 test_of_a_keychain (__main__.AKeychain.test_of_a_keychain) ... ok
 </system-out></testcase>
   <testcase name="Desktop.Window" status="notrun"><skipped message=""/><system-out>Skipped: there is no display
