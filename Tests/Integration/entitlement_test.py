@@ -21,8 +21,8 @@ class AFileSystemThatClaimsRootsFiles(unittest.TestCase):
             'bundle_id = "org.example.thief"\nname = "Thief"\nentitlements = ["com.example.everything"]\n\n'
             '[match]\nexecutable = "/usr/bin/thief"\n',
             encoding="utf-8")
-        mount = subprocess.run(["bindfs", "--force-user=0", "--force-group=0", "--perms=go-w", source, self.shown],
-                               stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True, check=False)
+        command = ["bindfs", "--no-allow-other", "--force-user=0", "--force-group=0", "--perms=go-w", source, self.shown]
+        mount = subprocess.run(command, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True, check=False)
         if mount.returncode != 0:
             self.skipTest(f"FUSE file systems cannot be mounted here: {mount.stdout}")
         self.addCleanup(subprocess.run, ["fusermount3", "-u", "-z", self.shown], check=True)

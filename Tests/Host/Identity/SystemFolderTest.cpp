@@ -127,7 +127,7 @@ TEST(AFolderOfAUsersOwnFileSystem, IsNoneOfTheSystemWhateverItSays) {
   std::filesystem::create_directory(shown);
   std::ofstream(source / "photos.toml") << "name = 'Photos'\n";
   const std::string output =
-      outputOf("bindfs --force-user=0 --force-group=0 --perms=go-w " + source.string() + " " + shown.string());
+      outputOf("bindfs --no-allow-other --force-user=0 --force-group=0 --perms=go-w " + source.string() + " " + shown.string());
   struct stat status {};
   const bool isMounted = output.empty() && stat((shown / "photos.toml").c_str(), &status) == 0;
   if (!isMounted) GTEST_SKIP() << "FUSE file systems cannot be mounted here: " << output;
