@@ -5,8 +5,8 @@ import selectors
 import sys
 import time
 
-from accounts import FACEBOOK, GRANTED, MANAGER, NAME, OBJECT, Caller, facebook_options
-from bus_wire import ERROR, REPLY_SERIAL, SLOWNESS, Message
+from accounts import FACEBOOK, GRANTED, MANAGER, NAME, OBJECT, PENDING, Caller, facebook_options
+from bus_wire import ERROR, MEMBER, PATH, REPLY_SERIAL, SLOWNESS, Message
 
 # What each connection asks, one after another without waiting; each begins at another question.
 QUESTIONS = [
@@ -40,8 +40,8 @@ def problem_with(question: int, answer: Message, token: str, clients: set[str]) 
     return None if is_right else f"question {question} is answered {values}"
 
 
-def ask_all(callers: list[Caller]) -> list[dict[int, int]]:
-    """Each caller's questions under their serial numbers."""
+def ask_all(callers: list[Caller]) -> list[dict[int | str, int]]:
+    """Each caller's questions under their serial numbers; later also under the path of a request that waits."""
     asked = []
     for place, caller in enumerate(callers):
         questions = {}
@@ -52,7 +52,12 @@ def ask_all(callers: list[Caller]) -> list[dict[int, int]]:
     return asked
 
 
-def take_answers(callers: list[Caller], asked: list[dict[int, int]], token: str, clients: set[str]) -> list[str]:
+def response_to(message: Message) -> str | None:
+    """The path of the request whose outcome this signal brings, or None."""
+    return message.fields.get(PATH) if message.fields.get(MEMBER) == "Response" else None
+
+
+def take_answers(callers: list[Caller], asked: list[dict[int | str, int]], token: str, clients: set[str]) -> list[str]:
     problems = []
     waiting = sum(map(len, asked))
     deadline = time.monotonic() + LONGEST_WAIT
@@ -64,7 +69,13 @@ def take_answers(callers: list[Caller], asked: list[dict[int, int]], token: str,
                 caller, questions = key.data
                 caller.receive()
                 for answer in caller.inbox:
-                    question = questions.pop(answer.fields.get(REPLY_SERIAL), None)
+                    question = questions.pop(response_to(answer) or answer.fields.get(REPLY_SERIAL), None)
+                    if question == 0 and answer.values[1:2] == [PENDING]:
+                        # One before it in its application's line was not through yet: the outcome comes as a signal.
+                        questions[answer.values[0]] = question
+                        continue
+                    if question == 0 and response_to(answer):
+                        answer.values.insert(0, "/")
                     if question is None:
                         if answer.fields.get(3) != "NameAcquired":
                             problems.append(f"an answer that nobody waits for: {answer.fields}")
